@@ -1,0 +1,35 @@
+// Document definition files (".ddf") and the keyword list built from them.
+#pragma once
+
+#include <cstddef>
+
+struct KeywordTarget {
+  KeywordTarget* Next;  // next (older) target
+  char* Anchor;
+  int DocumentIndex;    // into DocumentTable
+};
+
+struct KeywordNode {
+  KeywordNode* Next;
+  char* Keyword;
+  KeywordTarget* Targets;  // newest first
+};
+
+// The list runs from the head node (empty keyword, never reported) to the
+// end node (never compared), sorted ignoring case.
+extern KeywordNode KeywordListHead;
+extern KeywordNode KeywordListEnd;
+
+// Decodes "#xx" escapes of a key into `out` (at most size - 1 bytes and a NUL)
+// and returns the decoded length (which may include NUL bytes).
+std::size_t DecodeKeyword(const char* key, char* out, std::size_t size);
+
+// ASCII letters folded to lower case, then unsigned bytes.
+int CompareIgnoringCase(const char* a, const char* b);
+
+int Load_Document_Index(int documentIndex, int loadKeys);
+void LoadKeywords(const char* definitionPath, int documentIndex);
+void AddKeywordTarget(const char* keyword, const char* anchor, int documentIndex);
+
+// Empties the list (tests only; the program never removes keywords).
+void KeywordListReset();

@@ -1,0 +1,23 @@
+// Reading of INI files with the semantics of the Windows profile API.
+#pragma once
+
+#include <cstddef>
+
+// Copies the value of [section] key from `file` into `buffer` (at most
+// size - 1 characters and a NUL) and returns the number of characters
+// copied, without the NUL.  A NULL key lists the section's key names, each
+// NUL-terminated, the list ended by an extra NUL, cut to fit.  A missing
+// file, section or key yields `def`.  A bare file name is looked up in
+// /etc/lomari/.
+unsigned long GetPrivateProfileStringA(const char* section, const char* key, const char* def,
+                                       char* buffer, unsigned long size, const char* file);
+
+// Parsed files are cached by path and modification time; tests that rewrite
+// a file within the same second call this.
+void ProfileCacheClear();
+
+// Parses INI text held in memory (used by the fuzz target and its replay).
+// Looks the key up as GetPrivateProfileStringA would.
+unsigned long ProfileStringFromText(const char* text, std::size_t length, const char* section,
+                                    const char* key, const char* def, char* buffer,
+                                    unsigned long size);

@@ -1,0 +1,24 @@
+// The words of the index as the word list shows them: loaded in one read,
+// '@' words skipped, sorted ignoring case and one leading backslash or brace.
+#pragma once
+
+#include <memory>
+#include <vector>
+
+extern int CommandWordCount;      // listed words that begin with a backslash
+extern int EnvironmentWordCount;  // listed words that begin with '{'
+
+struct WordListData {
+  std::unique_ptr<char[]> RecordBuffer;  // the word record area, words NUL-terminated
+  std::vector<const char*> Words;        // sorted, pointing into RecordBuffer
+};
+
+// Fills `data` from the open word index; 0 (list empty) when none is open.
+int Fill_WordIndex(WordListData& data);
+
+// The list's order: <0, 0, >0.
+int CompareIndexWords(const char* a, const char* b);
+
+// Row of the first word that starts with `text` (see the word list rules),
+// or with `exact` the row of the word equal to it; -1 when none.
+int FindWordInList(const std::vector<const char*>& words, const char* text, int exact);
