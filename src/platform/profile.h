@@ -21,3 +21,7 @@ void ProfileCacheClear();
 unsigned long ProfileStringFromText(const char* text, std::size_t length, const char* section,
                                     const char* key, const char* def, char* buffer,
                                     unsigned long size);
+
+// Where bare file names are looked up (default /etc/lomari); NULL restores
+// the default.  For tests, which cannot write the real one.
+void ProfileSetSystemDirectory(const char* dir);

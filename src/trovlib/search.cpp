@@ -1,0 +1,296 @@
+// TrovSearch: categories, path patterns and the file-name index of each
+// recursively searched tree.
+#include <dirent.h>
+#include <sys/stat.h>
+#include <unistd.h>
+
+#include <algorithm>
+#include <cstdlib>
+#include <cstring>
+#include <deque>
+#include <memory>
+#include <set>
+#include <string>
+#include <unordered_map>
+#include <utility>
+#include <vector>
+
+#include "trovlib/trovlib.h"
+#include "trovlib/trovlib_internal.h"
+
+namespace trovlib {
+namespace {
+
+constexpr const char* kDefaultIconThemes = "/usr/share/icons/hicolor:/usr/share/icons/Adwaita";
+constexpr const char* kImageExtensions[] = {".png", ".xpm", ".bmp", ".ico"};
+constexpr const char* kIconSizes[] = {"24x24", "22x22", "16x16", "32x32"};
+constexpr int kMaxTreeDepth = 64;
+
+// Every file below one directory, by base name.  Paths of one name keep the
+// walk's order: shallower first, then by byte order of the names, so that the
+// same tree always gives the same answer.
+struct TreeIndex {
+  std::unordered_map<std::string, std::vector<std::string>> by_name;
+};
+
+std::unordered_map<std::string, std::unique_ptr<TreeIndex>>& Indexes() {
+  static std::unordered_map<std::string, std::unique_ptr<TreeIndex>> indexes;
+  return indexes;
+}
+
+std::string JoinPath(const std::string& dir, const std::string& name) {
+  if (dir.empty()) return name;
+  if (dir.back() == '/') return dir + name;
+  return dir + "/" + name;
+}
+
+// Strips trailing separators but keeps a lone "/".
+std::string TrimDirectory(std::string dir) {
+  while (dir.size() > 1 && dir.back() == '/') dir.pop_back();
+  return dir;
+}
+
+std::unique_ptr<TreeIndex> BuildIndex(const std::string& root) {
+  auto index = std::make_unique<TreeIndex>();
+  std::set<std::pair<dev_t, ino_t>> visited;  // symbolic links may form loops
+  std::deque<std::pair<std::string, int>> pending;
+  pending.emplace_back(root, 0);
+
+  while (!pending.empty()) {
+    auto [dir, depth] = pending.front();
+    pending.pop_front();
+    struct stat dir_stat;
+    if (stat(dir.c_str(), &dir_stat) != 0 || !S_ISDIR(dir_stat.st_mode)) continue;
+    if (!visited.insert({dir_stat.st_dev, dir_stat.st_ino}).second) continue;
+
+    DIR* handle = opendir(dir.c_str());
+    if (handle == nullptr) continue;
+    std::vector<std::pair<std::string, unsigned char>> entries;
+    while (dirent* entry = readdir(handle)) {
+      if (std::strcmp(entry->d_name, ".") == 0 || std::strcmp(entry->d_name, "..") == 0) continue;
+      entries.emplace_back(entry->d_name, entry->d_type);
+    }
+    closedir(handle);
+    std::sort(entries.begin(), entries.end());
+
+    for (const auto& [name, type] : entries) {
+      std::string path = JoinPath(dir, name);
+      bool is_dir = type == DT_DIR;
+      bool is_file = type == DT_REG;
+      if (type == DT_LNK || type == DT_UNKNOWN) {
+        struct stat st;
+        if (stat(path.c_str(), &st) != 0) continue;
+        is_dir = S_ISDIR(st.st_mode);
+        is_file = S_ISREG(st.st_mode);
+      }
+      if (is_file) {
+        index->by_name[name].push_back(std::move(path));
+      } else if (is_dir && depth < kMaxTreeDepth) {
+        pending.emplace_back(std::move(path), depth + 1);
+      }
+    }
+  }
+  return index;
+}
+
+const TreeIndex& IndexOf(const std::string& root) {
+  auto& indexes = Indexes();
+  auto it = indexes.find(root);
+  if (it == indexes.end()) it = indexes.emplace(root, BuildIndex(root)).first;
+  return *it->second;
+}
+
+bool IsRegularFile(const std::string& path, bool executable) {
+  struct stat st;
+  if (stat(path.c_str(), &st) != 0 || !S_ISREG(st.st_mode)) return false;
+  return !executable || access(path.c_str(), X_OK) == 0;
+}
+
+// The name as the index sees it: '/' separators, no empty or "." steps.
+// False for a name that is empty or climbs out of its tree with "..".
+bool NormaliseName(const char* raw, std::string& name, bool& absolute) {
+  std::string text(raw);
+  for (char& c : text)
+    if (c == '\\') c = '/';
+  absolute = !text.empty() && text[0] == '/';
+  name.clear();
+  std::size_t start = 0;
+  while (start <= text.size()) {
+    std::size_t end = text.find('/', start);
+    if (end == std::string::npos) end = text.size();
+    std::string step = text.substr(start, end - start);
+    start = end + 1;
+    if (step.empty() || step == ".") continue;
+    if (step == "..") return false;
+    if (!name.empty()) name += '/';
+    name += step;
+  }
+  return !name.empty();
+}
+
+// One place to look: a directory, alone or with everything below it.
+struct SearchRoot {
+  std::string dir;
+  bool recursive;
+};
+
+void AddPatternRoots(const std::string& pattern, std::vector<SearchRoot>& roots) {
+  std::vector<std::string> expanded;
+  if (!ExpandPattern(pattern, expanded)) return;
+  for (const auto& e : expanded) {
+    bool recursive = e.size() >= 2 && e.compare(e.size() - 2, 2, "//") == 0;
+    std::string dir = TrimDirectory(e);
+    if (!dir.empty()) roots.push_back({dir, recursive});
+  }
+}
+
+// How much an icon's directory is preferred: 24, 22, 16, 32 pixels, then
+// anything else.
+int IconSizeRank(const std::string& path, std::size_t from) {
+  for (int i = 0; i < 4; ++i) {
+    std::string step = std::string("/") + kIconSizes[i] + "/";
+    if (path.find(step, from) != std::string::npos) return i;
+  }
+  return 4;
+}
+
+class Searcher {
+ public:
+  Searcher(const std::string& name, bool image_names, bool executable, bool rank_sizes)
+      : executable_(executable), rank_sizes_(rank_sizes) {
+    std::size_t slash = name.rfind('/');
+    std::string base = slash == std::string::npos ? name : name.substr(slash + 1);
+    if (image_names && base.find('.') == std::string::npos) {
+      for (const char* ext : kImageExtensions) variants_.push_back(name + ext);
+    } else {
+      variants_.push_back(name);
+    }
+  }
+
+  // The best match below one root, or false.
+  bool Find(const SearchRoot& root, std::string& found) const {
+    if (!root.recursive) {
+      for (const auto& v : variants_) {
+        std::string path = JoinPath(root.dir, v);
+        if (IsRegularFile(path, executable_)) {
+          found = path;
+          return true;
+        }
+      }
+      return false;
+    }
+    const TreeIndex& index = IndexOf(root.dir);
+    // Best is the lowest size rank, then the earliest variant, then the
+    // earliest path; without ranking the first match wins at once.
+    const std::string* best = nullptr;
+    int best_rank = 5;
+    for (const auto& variant : variants_) {
+      std::size_t slash = variant.rfind('/');
+      auto it = index.by_name.find(slash == std::string::npos ? variant : variant.substr(slash + 1));
+      if (it == index.by_name.end()) continue;
+      for (const auto& path : it->second) {
+        if (slash != std::string::npos && !HasTail(path, variant)) continue;
+        if (executable_ && !IsRegularFile(path, true)) continue;
+        int rank = rank_sizes_ ? IconSizeRank(path, root.dir.size()) : 0;
+        if (rank < best_rank) {
+          best = &path;
+          best_rank = rank;
+        }
+        if (best_rank == 0) break;
+      }
+      if (best_rank == 0) break;
+    }
+    if (best == nullptr) return false;
+    found = *best;
+    return true;
+  }
+
+ private:
+  // The name's directories must end the found path, step for step.
+  static bool HasTail(const std::string& path, const std::string& tail) {
+    if (path.size() <= tail.size()) return false;
+    std::size_t at = path.size() - tail.size();
+    return path[at - 1] == '/' && path.compare(at, tail.size(), tail) == 0;
+  }
+
+  std::vector<std::string> variants_;
+  bool executable_;
+  bool rank_sizes_;
+};
+
+std::vector<std::string> IconThemes() {
+  const char* themes = std::getenv("TROVLIB_ICON_THEMES");
+  return SplitList(themes ? themes : kDefaultIconThemes);
+}
+
+}  // namespace
+
+void ResetSearchCaches() { Indexes().clear(); }
+
+}  // namespace trovlib
+
+const char* TrovSearch(const char* spec, const char* name) {
+  using namespace trovlib;
+  static std::string result;
+  if (spec == nullptr || name == nullptr) return nullptr;
+  std::string normal;
+  bool absolute = false;
+  if (!NormaliseName(name, normal, absolute)) return nullptr;
+
+  std::lock_guard<std::mutex> lock(LibraryMutex());
+  const std::string category(spec);
+  const bool program = category == "Program";
+  if (absolute) {
+    std::string path = "/" + normal;
+    if (!IsRegularFile(path, program)) return nullptr;
+    result = path;
+    return result.c_str();
+  }
+
+  // Each group of roots is searched with its own rules, in order.
+  struct Group {
+    std::vector<SearchRoot> roots;
+    bool image_names;
+    bool rank_sizes;
+  };
+  std::vector<Group> groups;
+  if (category == "TeX system documentation") {
+    groups.push_back({{}, false, false});
+    AddPatternRoots("$TEXMF/doc//", groups.back().roots);
+  } else if (program) {
+    groups.push_back({{}, false, false});
+    const char* path = std::getenv("PATH");
+    for (const auto& dir : SplitList(path ? path : "")) groups.back().roots.push_back({TrimDirectory(dir), false});
+  } else if (category == "Icon") {
+    groups.push_back({{}, true, true});
+    AddPatternRoots("$TEXMF/Docuvane/icons//", groups.back().roots);
+    for (const auto& theme : IconThemes()) {
+      groups.push_back({{}, true, false});
+      for (const char* size : kIconSizes)
+        groups.back().roots.push_back({JoinPath(TrimDirectory(theme), size), true});
+    }
+  } else if (category == "Logo") {
+    groups.push_back({{}, true, false});
+    AddPatternRoots("$TEXMF/Docuvane//", groups.back().roots);
+  } else {
+    groups.push_back({{}, false, false});
+    AddPatternRoots(category, groups.back().roots);
+  }
+
+  for (const auto& group : groups) {
+    Searcher searcher(normal, group.image_names, program, group.rank_sizes);
+    for (const auto& root : group.roots) {
+      std::string found;
+      if (searcher.Find(root, found)) {
+        result = found;
+        return result.c_str();
+      }
+    }
+  }
+  return nullptr;
+}
+
+void TrovResetCaches() {
+  std::lock_guard<std::mutex> lock(trovlib::LibraryMutex());
+  trovlib::ResetSearchCaches();
+}
