@@ -2,6 +2,7 @@
 #pragma once
 
 #include <cstddef>
+#include <string>
 
 struct KeywordTarget {
   KeywordTarget* Next;  // next (older) target
@@ -15,6 +16,9 @@ struct KeywordNode {
   KeywordTarget* Targets;  // newest first
 };
 
+// Longest decoded keyword kept; longer keys are skipped with a warning.
+constexpr std::size_t kMaxKeywordBytes = 63;
+
 // The list runs from the head node (empty keyword, never reported) to the
 // end node (never compared), sorted ignoring case.
 extern KeywordNode KeywordListHead;
@@ -26,6 +30,11 @@ std::size_t DecodeKeyword(const char* key, char* out, std::size_t size);
 
 // ASCII letters folded to lower case, then unsigned bytes.
 int CompareIgnoringCase(const char* a, const char* b);
+
+// The definition file's name for a document file name: cut at the last "."
+// of the file's own name (not of a directory) and ".ddf" appended.
+// The file name is first cut to 127 bytes.
+std::string DefinitionFileName(const char* fileName);
 
 int Load_Document_Index(int documentIndex, int loadKeys);
 void LoadKeywords(const char* definitionPath, int documentIndex);

@@ -1,0 +1,209 @@
+// Document definition files and the sorted keyword list built from them.
+#include "catalogue/keywords.h"
+
+#include <cstring>
+#include <memory>
+#include <new>
+#include <string>
+#include <vector>
+
+#include "catalogue/documents.h"
+#include "catalogue/pool.h"
+#include "platform/profile.h"
+#include "shell/settings.h"
+#include "shell/trace.h"
+#include "trovlib/trovlib.h"
+
+namespace {
+
+constexpr const char* kDocumentCategory = "TeX system documentation";
+constexpr const char* kKeywordsSection = "Keywords";
+constexpr unsigned long kKeyListSize = 32000;
+constexpr unsigned long kValueSize = 128;
+constexpr std::size_t kFileNameBufferSize = 128;
+
+char g_emptyKeyword[1] = {'\0'};
+
+// Where the last keyword was found or inserted.  Keys of one file usually
+// come sorted, so walking on from here instead of from the head keeps
+// loading close to linear.  Nodes are never removed, so it stays valid
+// until the list is reset.
+KeywordNode* g_lastNode = nullptr;
+
+int HexValue(unsigned char c) {
+  if (c >= '0' && c <= '9') return c - '0';
+  if (c >= 'a' && c <= 'f') return c - 'a' + 10;
+  if (c >= 'A' && c <= 'F') return c - 'A' + 10;
+  return 0;
+}
+
+unsigned char FoldCase(unsigned char c) {
+  return (c >= 'A' && c <= 'Z') ? static_cast<unsigned char>(c - 'A' + 'a') : c;
+}
+
+// A NUL-terminated copy of `text` in pool memory, or NULL.
+char* PoolCopy(const char* text) {
+  const std::size_t length = std::strlen(text);
+  if (length >= static_cast<std::size_t>(kPoolChunkSize)) {
+    // Cannot come from the keyword buffers; let the pool report it.
+    PoolAlloc(1, kPoolChunkSize + 1);
+    return nullptr;
+  }
+  char* copy = static_cast<char*>(PoolAlloc(1, static_cast<int>(length) + 1));
+  if (copy != nullptr) std::memcpy(copy, text, length + 1);
+  return copy;
+}
+
+}  // namespace
+
+KeywordNode KeywordListEnd = {nullptr, g_emptyKeyword, nullptr};
+KeywordNode KeywordListHead = {&KeywordListEnd, g_emptyKeyword, nullptr};
+
+std::size_t DecodeKeyword(const char* key, char* out, std::size_t size) {
+  if (size == 0) return 0;
+  std::size_t n = 0;
+  const unsigned char* p = reinterpret_cast<const unsigned char*>(key);
+  while (*p != '\0' && n + 1 < size) {
+    if (*p != '#') {
+      out[n++] = static_cast<char>(*p++);
+    } else if (p[1] == '\0') {
+      ++p;  // a lone "#" at the end is dropped
+    } else if (p[2] == '\0') {
+      out[n++] = static_cast<char>(HexValue(p[1]));
+      p += 2;
+    } else {
+      out[n++] = static_cast<char>(16 * HexValue(p[1]) + HexValue(p[2]));
+      p += 3;
+    }
+  }
+  out[n] = '\0';
+  return n;
+}
+
+int CompareIgnoringCase(const char* a, const char* b) {
+  const unsigned char* x = reinterpret_cast<const unsigned char*>(a);
+  const unsigned char* y = reinterpret_cast<const unsigned char*>(b);
+  for (;; ++x, ++y) {
+    const unsigned char cx = FoldCase(*x);
+    const unsigned char cy = FoldCase(*y);
+    if (cx != cy) return cx < cy ? -1 : 1;
+    if (cx == '\0') return 0;
+  }
+}
+
+std::string DefinitionFileName(const char* fileName) {
+  std::string name(fileName, strnlen(fileName, kFileNameBufferSize - 1));
+  // Only a dot of the file's own name starts an extension; one in a
+  // directory name ("tex.v2/README") must not cut the path.
+  const std::size_t slash = name.find_last_of("/\\");
+  const std::size_t dot = name.rfind('.');
+  if (dot != std::string::npos && (slash == std::string::npos || dot > slash)) name.erase(dot);
+  name += ".ddf";
+  return name;
+}
+
+int Load_Document_Index(int documentIndex, int loadKeys) {
+  if (documentIndex < 0 || documentIndex >= kMaxDocuments) return 0;
+  DocumentEntry& entry = DocumentTable[documentIndex];
+
+  const std::string shown(entry.FileName, 0, kFileNameBufferSize - 1);
+  if (TraceMode != 0) TraceMessage("INFO: Load_Document_Index - ", shown.c_str());
+
+  const std::string ddfName = DefinitionFileName(entry.FileName.c_str());
+  const char* found = TrovSearch(kDocumentCategory, ddfName.c_str());
+  if (found == nullptr) return 0;
+  const std::string path(found);  // the library's string does not last
+
+  char keys[32];
+  if (GetPrivateProfileStringA(kKeywordsSection, nullptr, "", keys, sizeof keys, path.c_str()) ==
+          0 ||
+      keys[0] == '\0')
+    return 0;
+
+  entry.DefinitionFile = path;
+  if (loadKeys) LoadKeywords(path.c_str(), documentIndex);
+  return 1;
+}
+
+void LoadKeywords(const char* definitionPath, int documentIndex) {
+  std::unique_ptr<char[]> keys(new (std::nothrow) char[kKeyListSize]);
+  if (!keys) {
+    TraceMessage("ERROR: Can't Allocate buffer for Key List from file: ", definitionPath);
+    return;
+  }
+  if (TraceMode != 0) TraceMessage("Loads Keys from file: ", definitionPath);
+
+  const unsigned long listLength = GetPrivateProfileStringA(kKeywordsSection, nullptr, "",
+                                                            keys.get(), kKeyListSize,
+                                                            definitionPath);
+  keys[kKeyListSize - 1] = '\0';
+  const char* const end = keys.get() + (listLength < kKeyListSize ? listLength : kKeyListSize - 1);
+  std::vector<char> keyword;
+  char value[kValueSize];
+  for (const char* key = keys.get(); key < end && *key != '\0'; key += std::strlen(key) + 1) {
+    // Decoding never lengthens a key, so a buffer of its size takes it all
+    // and shows whether the keyword is too long to keep.
+    keyword.resize(std::strlen(key) + 1);
+    if (DecodeKeyword(key, keyword.data(), keyword.size()) > kMaxKeywordBytes) {
+      TraceMessage("WARNING: Keyword longer than 63 bytes skipped: ", key);
+      continue;
+    }
+
+    GetPrivateProfileStringA(kKeywordsSection, key, key, value, sizeof value, definitionPath);
+    if (value[0] == '\0') {
+      AddKeywordTarget(keyword.data(), key, documentIndex);
+      continue;
+    }
+    // Every piece between "#" is one anchor, empty ones included.
+    char* piece = value;
+    for (;;) {
+      char* hash = std::strchr(piece, '#');
+      if (hash != nullptr) *hash = '\0';
+      AddKeywordTarget(keyword.data(), piece, documentIndex);
+      if (hash == nullptr) break;
+      piece = hash + 1;
+    }
+  }
+}
+
+void AddKeywordTarget(const char* keyword, const char* anchor, int documentIndex) {
+  KeywordNode* previous = &KeywordListHead;
+  KeywordNode* current = &KeywordListHead;
+  if (g_lastNode != nullptr && CompareIgnoringCase(g_lastNode->Keyword, keyword) <= 0)
+    previous = current = g_lastNode;
+
+  KeywordNode* node = nullptr;
+  while (current != &KeywordListEnd) {
+    const int order = CompareIgnoringCase(current->Keyword, keyword);
+    if (order == 0) {
+      node = current;
+      break;
+    }
+    if (order > 0) break;
+    previous = current;
+    current = current->Next;
+    if (current == nullptr) return;  // a broken list: add nothing
+  }
+
+  if (node == nullptr) {
+    void* memory = PoolAlloc(1, static_cast<int>(sizeof(KeywordNode)));
+    if (memory == nullptr) return;  // the pool has said why
+    char* copy = PoolCopy(keyword);
+    if (copy == nullptr) return;
+    node = new (memory) KeywordNode{current, copy, nullptr};
+    previous->Next = node;
+  }
+  g_lastNode = node;
+
+  void* memory = PoolAlloc(1, static_cast<int>(sizeof(KeywordTarget)));
+  if (memory == nullptr) return;
+  char* copy = PoolCopy(anchor);
+  if (copy == nullptr) return;
+  node->Targets = new (memory) KeywordTarget{node->Targets, copy, documentIndex};
+}
+
+void KeywordListReset() {
+  KeywordListHead.Next = &KeywordListEnd;
+  KeywordListHead.Targets = nullptr;
+  g_lastNode = nullptr;
+}
