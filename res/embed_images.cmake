@@ -1,0 +1,20 @@
+# Writes OUTPUT, a C++ header holding every file of INPUTS (a ;-list) as a
+# byte array, and the table kDocuvaneIconImages of (data, size) pairs.
+file(WRITE "${OUTPUT}.tmp" "// Generated from res/*.png by res/embed_images.cmake; do not edit.\n#pragma once\n\n#include <cstddef>\n\n")
+set(index 0)
+set(table "")
+foreach(input IN LISTS INPUTS)
+  file(READ "${input}" hex HEX)
+  string(LENGTH "${hex}" hexLength)
+  math(EXPR byteCount "${hexLength} / 2")
+  string(REGEX REPLACE "([0-9a-f][0-9a-f])" "0x\\1," bytes "${hex}")
+  # Break the lines every 16 bytes so the header stays readable.
+  string(REPEAT "0x[0-9a-f][0-9a-f]," 16 sixteen)
+  string(REGEX REPLACE "(${sixteen})" "\\1\n  " bytes "${bytes}")
+  get_filename_component(name "${input}" NAME)
+  file(APPEND "${OUTPUT}.tmp" "// ${name}\nstatic const unsigned char kDocuvaneIcon${index}[${byteCount}] = {\n  ${bytes}\n};\n\n")
+  string(APPEND table "  {kDocuvaneIcon${index}, ${byteCount}},\n")
+  math(EXPR index "${index} + 1")
+endforeach()
+file(APPEND "${OUTPUT}.tmp" "struct EmbeddedImage {\n  const unsigned char* data;\n  std::size_t size;\n};\n\nstatic const EmbeddedImage kDocuvaneIconImages[] = {\n${table}};\n")
+file(RENAME "${OUTPUT}.tmp" "${OUTPUT}")

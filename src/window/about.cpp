@@ -1,0 +1,78 @@
+// The About dialog.  It has no handlers: wxID_CANCEL closes it.
+#include "window/about.h"
+
+#include <wx/button.h>
+#include <wx/image.h>
+#include <wx/sizer.h>
+#include <wx/statbmp.h>
+#include <wx/stattext.h>
+
+#include <cctype>
+#include <string>
+
+#if __has_include("shell/app.h")
+#include "shell/app.h"
+#else
+static const char* AppTitle = "Lomari Docuvane";
+#endif
+#include "trovlib/trovlib.h"
+
+namespace {
+
+constexpr int kGap = 12;
+
+bool EndsWithBmp(const std::string& path) {
+  if (path.size() < 4) return false;
+  std::string tail = path.substr(path.size() - 4);
+  for (char& c : tail) c = static_cast<char>(std::tolower(static_cast<unsigned char>(c)));
+  return tail == ".bmp";
+}
+
+wxStaticText* CentredText(wxWindow* parent, const wxString& text) {
+  return new wxStaticText(parent, wxID_ANY, text, wxDefaultPosition, wxDefaultSize,
+                          wxALIGN_CENTRE_HORIZONTAL);
+}
+
+}  // namespace
+
+AboutDlg::AboutDlg(wxWindow* parent)
+    : wxDialog(parent, wxID_ANY, "About ...", wxDefaultPosition, wxDefaultSize, wxDEFAULT_DIALOG_STYLE) {
+  SetFont(wxFont(10, wxFONTFAMILY_DEFAULT, wxFONTSTYLE_NORMAL, wxFONTWEIGHT_NORMAL, false, wxEmptyString,
+                 wxFONTENCODING_DEFAULT));
+  wxBoxSizer* column = new wxBoxSizer(wxVERTICAL);
+
+  if (const char* found = TrovSearch("Logo", "Docuvane")) {
+    const std::string path = found;
+    wxImage image(wxString(path.c_str(), wxConvLocal), wxBITMAP_TYPE_ANY);
+    if (image.IsOk()) {
+      if (EndsWithBmp(path)) image.SetMaskColour(192, 192, 192);
+      column->AddSpacer(kGap);
+      column->Add(new wxStaticBitmap(this, wxID_ANY, wxBitmap(image)), 0, wxALIGN_CENTRE_HORIZONTAL);
+    }
+  }
+  column->AddSpacer(kGap);
+
+  wxStaticText* title = CentredText(this, wxString(AppTitle, wxConvLocal));
+  title->SetFont(GetFont().Bold());
+  title->SetForegroundColour(wxColour(128, 0, 128));
+  column->Add(title, 0, wxALIGN_CENTRE_HORIZONTAL);
+  column->Add(CentredText(this, "Lomari TeX Documentation Organizer"), 0, wxALIGN_CENTRE_HORIZONTAL);
+  column->AddSpacer(kGap);
+  column->Add(CentredText(this, "Version 5.0 (2011/03/17)"), 0, wxALIGN_CENTRE_HORIZONTAL);
+  column->AddSpacer(kGap);
+  column->Add(CentredText(this, wxString::FromUTF8("Copyright \xC2\xA9 2011 Lomari. All rights reserved.")),
+              0, wxALIGN_CENTRE_HORIZONTAL);
+
+  column->AddSpacer(2 * kGap);
+  column->Add(new wxButton(this, wxID_CANCEL, "Close"), 0, wxALIGN_CENTRE_HORIZONTAL);
+  column->AddSpacer(kGap);
+
+  wxBoxSizer* row = new wxBoxSizer(wxHORIZONTAL);
+  row->AddSpacer(kGap);
+  row->Add(column, 0, wxEXPAND | wxALL, kGap);
+  row->AddSpacer(kGap);
+  SetSizerAndFit(row);
+  Centre(wxBOTH);
+}
+
+AboutDlg::~AboutDlg() = default;

@@ -1,0 +1,138 @@
+// The main frame: geometry kept between runs, the help panel, the catalogue
+// and the counts in the status bar.
+#include "window/frame.h"
+
+#include <wx/config.h>
+#include <wx/iconbndl.h>
+#include <wx/image.h>
+#include <wx/mstream.h>
+
+#include <cstdio>
+
+#if __has_include("access/start_page.h")
+#include "access/start_page.h"
+#define DOCUVANE_HAVE_START_PAGE 1
+#endif
+#include "catalogue/documents.h"
+#include "docuvane_icons.h"
+#include "shell/trace.h"
+#include "trovlib/trovlib.h"
+#include "window/about.h"
+#include "window/ids.h"
+#include "window/panel.h"
+#include "wordindex/wordlist.h"
+
+namespace {
+
+constexpr long kDefaultX = 50, kDefaultY = 50, kDefaultW = 800, kDefaultH = 600;
+constexpr int kMinimumDip = 512;
+
+// The icon images compiled in from res/.
+wxIconBundle ApplicationIcons() {
+  if (!wxImage::FindHandler(wxBITMAP_TYPE_PNG)) wxImage::AddHandler(new wxPNGHandler);
+  wxIconBundle icons;
+  for (const EmbeddedImage& embedded : kDocuvaneIconImages) {
+    wxMemoryInputStream stream(embedded.data, embedded.size);
+    wxImage image;
+    if (!image.LoadFile(stream, wxBITMAP_TYPE_PNG)) continue;
+    wxIcon icon;
+    icon.CopyFromBitmap(wxBitmap(image));
+    icons.AddIcon(icon);
+  }
+  return icons;
+}
+
+}  // namespace
+
+// clang-format off
+wxBEGIN_EVENT_TABLE(MyFrame, wxFrame)
+  EVT_MENU(wxID_EXIT, MyFrame::OnQuit)
+  EVT_MENU(wxID_CLOSE, MyFrame::OnQuit)
+  EVT_MENU(wxID_ABOUT, MyFrame::OnAbout)
+  EVT_MENU(ID_INTERNET, MyFrame::OnInternet)
+  EVT_MENU(wxID_HELP, MyFrame::OnHelp)
+  EVT_BUTTON(wxID_ABOUT, MyFrame::OnAbout)
+  EVT_BUTTON(ID_INTERNET, MyFrame::OnInternet)
+  EVT_BUTTON(wxID_HELP, MyFrame::OnHelp)
+wxEND_EVENT_TABLE()
+// clang-format on
+
+MyFrame::MyFrame(const wxString& title)
+    : wxFrame(nullptr, wxID_ANY, title, wxDefaultPosition, wxDefaultSize, wxDEFAULT_FRAME_STYLE,
+              wxFrameNameStr) {
+  long x = kDefaultX, y = kDefaultY, w = kDefaultW, h = kDefaultH;
+  if (wxConfigBase* config = wxConfigBase::Get()) {
+    config->SetPath("/MainWindow");
+    x = config->ReadLong("x", kDefaultX);
+    y = config->ReadLong("y", kDefaultY);
+    w = config->ReadLong("w", kDefaultW);
+    h = config->ReadLong("h", kDefaultH);
+  }
+  const wxPoint storedPosition = FromDIP(wxPoint(static_cast<int>(x), static_cast<int>(y)));
+  const wxSize storedSize = FromDIP(wxSize(static_cast<int>(w), static_cast<int>(h)));
+  const wxSize screen = VirtualScreenSize();
+  SetMinSize(FromDIP(wxSize(kMinimumDip, kMinimumDip)));
+  const wxRect geometry = ClampFrameGeometry(wxRect(storedPosition, storedSize),
+                                             FromDIP(wxSize(kDefaultW, kDefaultH)), screen);
+  Move(geometry.GetPosition());
+  SetSize(geometry.GetSize());
+
+  const wxIconBundle icons = ApplicationIcons();
+  if (icons.GetIconCount() > 0) SetIcons(icons);
+  SetFont(wxFont(10, wxFONTFAMILY_DEFAULT, wxFONTSTYLE_NORMAL, wxFONTWEIGHT_NORMAL, false, wxEmptyString,
+                 wxFONTENCODING_DEFAULT));
+
+  CreateStatusBar(1);
+  SetStatusText("There are # documents including # TeX commands and # LaTeX environments.", 0);
+
+  TraceMessage("Docuvane::Frame --- ", "Creating Helper ...");
+  m_helpPanel = new Docuvane(this, wxDefaultPosition, wxDefaultSize);
+  TraceMessage("Docuvane::Frame --- ", "Collect_Documents ...");
+  Collect_Documents();
+  TraceMessage("Docuvane::Frame --- ", "Fill_Tree ...");
+  Fill_Tree(m_helpPanel);
+  TraceMessage("Docuvane::Frame --- ", "Fill_WordIndex ...");
+  TraceMessage("Docuvane::Frame --- ", "Post.");
+
+  char summary[160];
+  std::snprintf(summary, sizeof summary,
+                "There are %d documents including %d TeX commands and %d LaTeX environments.",
+                DocumentCount, CommandWordCount, EnvironmentWordCount);
+  SetStatusText(summary, 0);
+  TraceMessage("Docuvane::Frame --- ", "End.");
+}
+
+MyFrame::~MyFrame() {
+  wxConfigBase* config = wxConfigBase::Get();
+  if (!config || IsIconized()) return;
+  if (IsMaximized()) {
+    config->Write("/MainWindow/Max", 1L);
+    return;
+  }
+  const wxPoint position = ToDIP(GetPosition());
+  const wxSize size = ToDIP(GetSize());
+  config->Write("/MainWindow/x", static_cast<long>(position.x));
+  config->Write("/MainWindow/y", static_cast<long>(position.y));
+  config->Write("/MainWindow/w", static_cast<long>(size.x));
+  config->Write("/MainWindow/h", static_cast<long>(size.y));
+  config->Write("/MainWindow/Max", 0L);
+}
+
+void MyFrame::OnQuit(wxCommandEvent&) { Close(true); }
+
+void MyFrame::OnAbout(wxCommandEvent&) {
+  AboutDlg dialog(this);
+  dialog.ShowModal();
+}
+
+void MyFrame::OnHelp(wxCommandEvent&) {
+  TrovMessage("INFO: MyFrame::OnHelp", "", 2);
+  ::ProcessCommand(m_helpPanel, ".LMR.Help", 1);
+}
+
+void MyFrame::OnInternet(wxCommandEvent&) {
+  TrovMessage("INFO: MyFrame::OnInternet", "", 2);
+#ifdef DOCUVANE_HAVE_START_PAGE
+  OpenStartPage();
+#endif
+}

@@ -1,0 +1,31 @@
+// The program's only top-level window: it restores its geometry, holds the
+// help panel, has the catalogue collected and shows the counts.
+#pragma once
+
+#include <wx/frame.h>
+#include <wx/gdicmn.h>
+
+class Docuvane;
+
+class MyFrame : public wxFrame {
+ public:
+  explicit MyFrame(const wxString& title);
+  ~MyFrame() override;
+
+  Docuvane* m_helpPanel = nullptr;
+
+  void OnQuit(wxCommandEvent& event);
+  void OnAbout(wxCommandEvent& event);
+  void OnHelp(wxCommandEvent& event);
+  void OnInternet(wxCommandEvent& event);
+
+ private:
+  wxDECLARE_EVENT_TABLE();
+};
+
+// The size of the bounding box of all monitors.
+wxSize VirtualScreenSize();
+
+// Where a frame with the stored geometry (pixels) opens on a screen of the
+// given size: at least the default size, at most the screen, moved inside it.
+wxRect ClampFrameGeometry(const wxRect& stored, const wxSize& defaultSize, const wxSize& screen);

@@ -1,0 +1,175 @@
+// The index pane at work: the search field selects a word, a word fills the
+// Locations list, a location is shown in the tree and opened.
+#include <wx/button.h>
+#include <wx/listbox.h>
+#include <wx/srchctrl.h>
+#include <wx/treectrl.h>
+
+#include <cstring>
+#include <string>
+#include <vector>
+
+#if __has_include("access/opendoc_gui.h")
+#include "access/opendoc_gui.h"
+#define DOCUVANE_HAVE_OPEN 1
+#endif
+#include "catalogue/documents.h"
+#include "catalogue/keywords.h"
+#include "trovlib/trovlib.h"
+#include "window/panel.h"
+#include "wordindex/qlistbox_gui.h"
+#include "wordindex/references.h"
+#include "wordindex/wordindex.h"
+
+wxTreeItemId HighlightedItem;
+
+namespace {
+
+int OpenLocation(wxWindow* parent, const char* name, const char* anchor) {
+#ifdef DOCUVANE_HAVE_OPEN
+  return OpenDocumentFile(parent, name, anchor);
+#else
+  (void)parent, (void)name, (void)anchor;
+  return 0;
+#endif
+}
+
+// Location texts are 8-bit in the locale's encoding; a text that does not
+// convert (a stray byte in a label) is shown byte for byte rather than lost.
+wxString ToDisplay(const std::string& text) {
+  wxString shown(text.c_str(), wxConvLocal);
+  if (shown.empty() && !text.empty()) shown = wxString(text.c_str(), wxConvISO8859_1);
+  return shown;
+}
+
+std::string FromDisplay(const wxString& text) {
+  wxCharBuffer narrow = text.mb_str(wxConvLocal);
+  if (narrow.data() && (narrow.length() || text.empty())) return std::string(narrow.data(), narrow.length());
+  wxCharBuffer latin = text.mb_str(wxConvISO8859_1);
+  return latin.data() ? std::string(latin.data(), latin.length()) : std::string();
+}
+
+std::string SelectedLocation(Docuvane* panel, int* row) {
+  *row = panel->m_targetList ? panel->m_targetList->GetSelection() : wxNOT_FOUND;
+  if (*row == wxNOT_FOUND) return std::string();
+  return FromDisplay(panel->m_targetList->GetString(static_cast<unsigned>(*row)));
+}
+
+}  // namespace
+
+void Show_Topic(Docuvane* panel, const char* word, int openIfSingle) {
+  if (!word) word = "";
+  TrovMessage("INFO: Docuvane::Show_Topic ", word, 3);
+  if (!panel) return;
+  wxListBox* locations = panel->m_targetList;
+  if (locations) locations->Clear();
+  if (panel->m_gotoButton) panel->m_gotoButton->Disable();
+  if (HighlightedItem.IsOk()) {
+    if (panel->m_tree) panel->m_tree->SetItemBold(HighlightedItem, false);
+    HighlightedItem.Unset();
+  }
+
+  const KeywordTargets targets = CollectKeywordTargets(word);
+  if (locations && !targets.items.empty()) {
+    wxArrayString texts;
+    for (const std::string& item : targets.items) texts.Add(ToDisplay(item));
+    locations->Append(texts);
+    // Selecting in code sends no event: "&Go To" waits for the user's choice.
+    locations->SetSelection(0);
+  }
+  if (openIfSingle && targets.single)
+    OpenLocation(panel, targets.singlePath.c_str(), targets.singleAnchor.c_str());
+
+  if (WordIndexHandle) {
+    const int32_t offset = FindIndexWord(word);
+    if (offset != 0) {
+      std::vector<std::string> items;
+      LoadWordReferences(offset, word, items);
+      if (locations && !items.empty()) {
+        wxArrayString texts;
+        for (const std::string& item : items) texts.Add(ToDisplay(item));
+        locations->Append(texts);
+      }
+    }
+  }
+}
+
+void HighlightDocument(Docuvane* panel, const char* text) {
+  if (!panel || !text) return;
+  // The document part of a location: up to the first "#", within 511 bytes.
+  std::string document(text, strnlen(text, 511));
+  const std::string::size_type hash = document.find('#');
+  if (hash != std::string::npos) document.resize(hash);
+
+  int found = -1;
+  for (int i = 0; i < DocumentCount; ++i) {
+    if (CompareIgnoringCase(DocumentTable[i].Path.c_str(), document.c_str()) == 0) {
+      found = i;
+      break;
+    }
+  }
+  if (found < 0 || !DocumentTable[found].TreeItem || !panel->m_tree) return;
+
+  const wxTreeItemId item(DocumentTable[found].TreeItem);
+  panel->m_tree->SelectItem(item);
+  if (HighlightedItem.IsOk()) panel->m_tree->SetItemBold(HighlightedItem, false);
+  panel->m_tree->SetItemBold(item, true);
+  HighlightedItem = item;
+}
+
+void Docuvane::OnSearch(wxCommandEvent&) {
+  if (!m_search) return;
+  const std::string text = FromDisplay(m_search->GetValue());
+  TrovMessage("INFO: Docuvane::OnSearch of ", text.c_str(), 3);
+  if (text.empty() || !m_wordList) return;
+  const int row = FindWordInList(m_wordList, text.c_str(), 0);
+  if (row < 0) return;  // keep the previous word and its locations
+  m_wordList->SetSelection(row);
+  Show_Topic(this, m_wordList->GetWord(row), 0);
+}
+
+void Docuvane::OnIndexChanged(wxCommandEvent&) {
+  if (!m_wordList) return;
+  const int row = m_wordList->GetSelection();
+  if (row == wxNOT_FOUND) {
+    TrovMessage("WARNING: Docuvane::OnIndexChanged ", "no selection in index", 4);
+    return;
+  }
+  const char* word = m_wordList->GetWord(row);
+  TrovMessage("INFO: Docuvane::OnIndexChanged to ", word, 3);
+  Show_Topic(this, word, 0);
+}
+
+void Docuvane::OnTargetChanged(wxCommandEvent&) {
+  TrovMessage("INFO: Docuvane::OnTargetChanged ", "", 3);
+  if (!m_targetList) return;
+  int row;
+  const std::string text = SelectedLocation(this, &row);
+  if (row != wxNOT_FOUND) {
+    if (m_gotoButton) m_gotoButton->Enable();
+    HighlightDocument(this, text.c_str());
+  } else if (m_gotoButton) {
+    m_gotoButton->Disable();
+  }
+}
+
+void Docuvane::OnTargetActivate(wxCommandEvent&) {
+  TrovMessage("INFO: Docuvane::OnTargetActivate ", "", 3);
+  if (!m_targetList) return;
+  int row;
+  const std::string text = SelectedLocation(this, &row);
+  if (row == wxNOT_FOUND) {
+    TrovMessage("WARNING: Docuvane::OnTargetActivate ", "no selection in index", 4);
+    return;
+  }
+  OpenLocation(this, text.c_str(), nullptr);
+}
+
+void Docuvane::OnGotoTarget(wxCommandEvent&) {
+  if (!m_targetList) return;
+  int row;
+  const std::string text = SelectedLocation(this, &row);
+  if (row == wxNOT_FOUND) return;
+  TrovMessage("INFO: Docuvane::OnGotoTarget ", text.c_str(), 3);
+  OpenLocation(this, text.c_str(), nullptr);
+}
