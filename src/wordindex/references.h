@@ -1,6 +1,7 @@
 // Turning one word into the texts of the Locations list.
 #pragma once
 
+#include <cstddef>
 #include <cstdint>
 #include <string>
 #include <vector>
@@ -18,3 +19,22 @@ struct KeywordTargets {
   std::string singleAnchor;
 };
 KeywordTargets CollectKeywordTargets(const char* word);
+
+// One location of a reference block's entry list: a label index (which may
+// name no label) and its pages in file order.
+struct ReferenceLocation {
+  int label = 0;
+  std::vector<int> pages;
+};
+
+// Decodes an entry list (compact form when bit 7 of its first byte is set,
+// long form otherwise).  Pages met before any location has started are
+// dropped; a label index that returns after another starts a new location.
+std::vector<ReferenceLocation> DecodeReferenceEntries(const unsigned char* entries,
+                                                      std::size_t size);
+
+// Page numbers are appended to a location's text only while it is shorter
+// than this.
+constexpr std::size_t kPageListCut = 200;
+// Keyword target texts ("path#anchor") longer than this are not listed.
+constexpr std::size_t kMaxKeywordTargetText = 127;

@@ -1,0 +1,39 @@
+// Finding command.Index: first among the installation's update files, then
+// in the documentation tree.
+#include "wordindex/locate.h"
+
+#include "platform/paths.h"
+#include "shell/trace.h"
+#include "trovlib/trovlib.h"
+
+std::string WordIndexPath;
+
+namespace {
+// The path was kept in a 256-byte buffer; longer paths are refused rather
+// than cut, since a cut path would name another file.
+constexpr std::size_t kMaxWordIndexPath = 255;
+constexpr const char* kWordIndexName = "command.Index";
+}  // namespace
+
+const std::string& LocateWordIndex() {
+  if (!WordIndexPath.empty()) return WordIndexPath;
+
+  const char* found = TrovSearch("${TEXDIR}/Update", kWordIndexName);
+  if (found == nullptr) found = TrovSearch("TeX system documentation", kWordIndexName);
+  if (found == nullptr) {
+    WordIndexPath.clear();
+    TraceMessage("Document Word Index File: ", "NOT FOUND");
+    return WordIndexPath;
+  }
+
+  std::string path = found;
+  if (path.size() > kMaxWordIndexPath) {
+    TraceMessage("ERROR: Word Index file path too long: ", path.c_str());
+    WordIndexPath.clear();
+    return WordIndexPath;
+  }
+  WordIndexPath = Fix_Slashes(path);
+  TraceMessage("Document Word Index File: ",
+               WordIndexPath.empty() ? "NOT FOUND" : WordIndexPath.c_str());
+  return WordIndexPath;
+}

@@ -1,0 +1,114 @@
+// The words of the index as the word list shows them.
+#include "wordindex/wordlist.h"
+
+#include <algorithm>
+#include <cstdio>
+#include <cstring>
+
+#include "platform/paths.h"
+#include "shell/trace.h"
+#include "wordindex/wordindex.h"
+
+int CommandWordCount = 0;
+int EnvironmentWordCount = 0;
+
+namespace {
+
+inline unsigned char Fold(unsigned char c) {
+  return (c >= 'A' && c <= 'Z') ? static_cast<unsigned char>(c + ('a' - 'A')) : c;
+}
+
+inline const char* DropLead(const char* w) { return (*w == '\\' || *w == '{') ? w + 1 : w; }
+
+inline int CompareFolded(const char* a, const char* b) {
+  const unsigned char* x = reinterpret_cast<const unsigned char*>(a);
+  const unsigned char* y = reinterpret_cast<const unsigned char*>(b);
+  for (;; ++x, ++y) {
+    const unsigned char cx = Fold(*x);
+    const unsigned char cy = Fold(*y);
+    if (cx != cy) return cx < cy ? -1 : 1;
+    if (cx == 0) return 0;
+  }
+}
+
+// True when the first n bytes of `word` equal `text` ignoring case (and
+// `word` is at least that long).
+bool StartsWithFolded(const char* word, const char* text, std::size_t n) {
+  for (std::size_t i = 0; i < n; ++i) {
+    const unsigned char w = static_cast<unsigned char>(word[i]);
+    if (w == 0) return false;
+    if (Fold(w) != Fold(static_cast<unsigned char>(text[i]))) return false;
+  }
+  return true;
+}
+
+}  // namespace
+
+int CompareIndexWords(const char* a, const char* b) { return CompareFolded(DropLead(a), DropLead(b)); }
+
+int Fill_WordIndex(WordListData& data) {
+  const unsigned long start = GetTickCount();
+  data.Words.clear();
+  data.RecordBuffer.reset();
+  if (WordIndexHandle == nullptr) return 0;
+
+  // The header checks guarantee min..max+1 offsets that rise and stay
+  // inside the file, so the area is sized by the file itself.
+  const int32_t areaStart = LengthOffsets[MinWordLength];
+  const int32_t areaEnd = LengthOffsets[MaxWordLength + 1];
+  const std::size_t areaSize = static_cast<std::size_t>(areaEnd - areaStart);
+  data.RecordBuffer.reset(new char[areaSize + 1]);
+  if (!ReadIndexBytes(areaStart, data.RecordBuffer.get(), areaSize)) {
+    data.RecordBuffer.reset();
+    TraceMessage("ERROR: Can't read the word records of Word Index file: ", nullptr);
+    return 0;
+  }
+  data.RecordBuffer[areaSize] = '\0';
+
+  std::size_t records = 0;
+  for (int L = MinWordLength; L <= MaxWordLength; ++L)
+    records += static_cast<std::size_t>(LengthOffsets[L + 1] - LengthOffsets[L]) / (L + 5);
+  data.Words.reserve(records);
+
+  char* area = data.RecordBuffer.get();
+  for (int L = MinWordLength; L <= MaxWordLength; ++L) {
+    const std::size_t size = static_cast<std::size_t>(L) + 5;
+    const std::size_t count = static_cast<std::size_t>(LengthOffsets[L + 1] - LengthOffsets[L]) / size;
+    char* record = area + (LengthOffsets[L] - areaStart);
+    for (std::size_t i = 0; i < count; ++i, record += size) {
+      record[L] = '\0';
+      if (strchr(record, '@') != nullptr) {
+        TraceMessage("WARNING: Skipped index word: ", record);
+        continue;
+      }
+      data.Words.push_back(record);
+      if (record[0] == '\\') ++CommandWordCount;
+      else if (record[0] == '{') ++EnvironmentWordCount;
+    }
+  }
+
+  std::sort(data.Words.begin(), data.Words.end(),
+            [](const char* a, const char* b) { return CompareFolded(DropLead(a), DropLead(b)) < 0; });
+
+  char elapsed[32];
+  snprintf(elapsed, sizeof elapsed, "%d ms", static_cast<int>(GetTickCount() - start));
+  TraceMessage("QListBox::Fill_WordIndex Time: ", elapsed);
+  return 1;
+}
+
+int FindWordInList(const std::vector<const char*>& words, const char* text, int exact) {
+  if (text == nullptr) return -1;
+  // A text that begins with a backslash or a brace asks for exactly that
+  // kind of word; otherwise the kinds are looked through.
+  const bool whole = (*text == '\\' || *text == '{');
+  const std::size_t n = strlen(text);
+  int first = -1;
+  for (std::size_t i = 0; i < words.size(); ++i) {
+    const char* word = whole ? words[i] : DropLead(words[i]);
+    if (!StartsWithFolded(word, text, n)) continue;
+    if (!exact) return static_cast<int>(i);
+    if (strcmp(word, text) == 0) return static_cast<int>(i);
+    if (first == -1) first = static_cast<int>(i);
+  }
+  return first;
+}
