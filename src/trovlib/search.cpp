@@ -44,8 +44,12 @@ std::string JoinPath(const std::string& dir, const std::string& name) {
   return dir + "/" + name;
 }
 
-// Strips trailing separators but keeps a lone "/".
-std::string TrimDirectory(std::string dir) {
+// Collapses runs of separators (a variable may end in one) and strips
+// trailing ones, but keeps a lone "/".
+std::string TrimDirectory(const std::string& text) {
+  std::string dir;
+  for (char c : text)
+    if (c != '/' || dir.empty() || dir.back() != '/') dir += c;
   while (dir.size() > 1 && dir.back() == '/') dir.pop_back();
   return dir;
 }
