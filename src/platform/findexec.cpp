@@ -1,0 +1,238 @@
+// The file-type association of the desktop, through xdg-mime and the
+// desktop entries of the XDG data directories.
+#include "platform/findexec.h"
+
+#include <fcntl.h>
+#include <poll.h>
+#include <signal.h>
+#include <spawn.h>
+#include <sys/stat.h>
+#include <sys/wait.h>
+#include <unistd.h>
+
+#include <cerrno>
+#include <chrono>
+#include <cstdlib>
+#include <fstream>
+#include <vector>
+
+extern char** environ;
+
+namespace {
+
+constexpr int kHelperTimeoutMs = 5000;
+constexpr std::size_t kMaxHelperOutput = 64 * 1024;
+
+std::string Trim(const std::string& text) {
+  const char* blanks = " \t\r\n";
+  std::size_t begin = text.find_first_not_of(blanks);
+  if (begin == std::string::npos) return std::string();
+  std::size_t end = text.find_last_not_of(blanks);
+  return text.substr(begin, end - begin + 1);
+}
+
+bool IsExecutableFile(const std::string& path) {
+  struct stat st;
+  return stat(path.c_str(), &st) == 0 && S_ISREG(st.st_mode) && access(path.c_str(), X_OK) == 0;
+}
+
+std::string FindOnPath(const std::string& program) {
+  if (program.empty()) return std::string();
+  if (program.find('/') != std::string::npos)
+    return IsExecutableFile(program) ? program : std::string();
+  const char* path = std::getenv("PATH");
+  std::string dirs = path ? path : "/usr/local/bin:/usr/bin:/bin";
+  std::size_t start = 0;
+  while (start <= dirs.size()) {
+    std::size_t end = dirs.find(':', start);
+    if (end == std::string::npos) end = dirs.size();
+    std::string dir = dirs.substr(start, end - start);
+    if (dir.empty()) dir = ".";
+    std::string candidate = dir + "/" + program;
+    if (IsExecutableFile(candidate)) return candidate;
+    start = end + 1;
+  }
+  return std::string();
+}
+
+// Splits an Exec value into its words: blanks separate, double quotes group,
+// and inside quotes a backslash escapes the next character.
+std::vector<std::string> SplitExec(const std::string& value) {
+  std::vector<std::string> words;
+  std::string word;
+  bool started = false;
+  bool quoted = false;
+  for (std::size_t i = 0; i < value.size(); ++i) {
+    char c = value[i];
+    if (quoted) {
+      if (c == '\\' && i + 1 < value.size()) {
+        word += value[++i];
+      } else if (c == '"') {
+        quoted = false;
+      } else {
+        word += c;
+      }
+    } else if (c == ' ' || c == '\t') {
+      if (started) words.push_back(word);
+      word.clear();
+      started = false;
+    } else if (c == '"') {
+      quoted = true;
+      started = true;
+    } else {
+      word += c;
+      started = true;
+    }
+  }
+  if (started) words.push_back(word);
+  return words;
+}
+
+// The Exec value of the [Desktop Entry] group of a desktop file, or "".
+std::string ReadExecLine(const std::string& file) {
+  std::ifstream in(file);
+  if (!in) return std::string();
+  std::string line;
+  bool inEntry = false;
+  while (std::getline(in, line)) {
+    line = Trim(line);
+    if (!line.empty() && line[0] == '[') {
+      inEntry = line == "[Desktop Entry]";
+      continue;
+    }
+    if (!inEntry || line.compare(0, 4, "Exec") != 0) continue;
+    std::string rest = Trim(line.substr(4));
+    if (!rest.empty() && rest[0] == '=') return Trim(rest.substr(1));
+  }
+  return std::string();
+}
+
+std::vector<std::string> DataDirectories() {
+  std::vector<std::string> dirs;
+  const char* home = std::getenv("XDG_DATA_HOME");
+  if (home && *home) {
+    dirs.push_back(home);
+  } else if (const char* h = std::getenv("HOME")) {
+    dirs.push_back(std::string(h) + "/.local/share");
+  }
+  const char* system = std::getenv("XDG_DATA_DIRS");
+  std::string list = system && *system ? system : "/usr/local/share:/usr/share";
+  std::size_t start = 0;
+  while (start < list.size()) {
+    std::size_t end = list.find(':', start);
+    if (end == std::string::npos) end = list.size();
+    if (end > start) dirs.push_back(list.substr(start, end - start));
+    start = end + 1;
+  }
+  return dirs;
+}
+
+// A desktop file id may stand for a file in a subdirectory: "a-b.desktop"
+// is also looked for as "a/b.desktop".
+std::string FindDesktopFile(const std::string& id) {
+  if (id.empty() || id.find('/') != std::string::npos) return std::string();
+  std::vector<std::string> names{id};
+  std::string variant = id;
+  for (std::size_t pos = variant.find('-'); pos != std::string::npos; pos = variant.find('-', pos + 1)) {
+    variant[pos] = '/';
+    names.push_back(variant);
+  }
+  for (const std::string& dir : DataDirectories()) {
+    for (const std::string& name : names) {
+      std::string path = dir + "/applications/" + name;
+      struct stat st;
+      if (stat(path.c_str(), &st) == 0 && S_ISREG(st.st_mode)) return path;
+    }
+  }
+  return std::string();
+}
+
+}  // namespace
+
+bool RunAndCapture(const char* const* argv, std::string& output, int timeoutMs) {
+  output.clear();
+  int fds[2];
+  if (pipe2(fds, O_CLOEXEC) != 0) return false;
+
+  posix_spawn_file_actions_t actions;
+  posix_spawn_file_actions_init(&actions);
+  posix_spawn_file_actions_addopen(&actions, 0, "/dev/null", O_RDONLY, 0);
+  posix_spawn_file_actions_adddup2(&actions, fds[1], 1);
+  posix_spawn_file_actions_addopen(&actions, 2, "/dev/null", O_WRONLY, 0);
+  pid_t pid = 0;
+  int rc = posix_spawnp(&pid, argv[0], &actions, nullptr, const_cast<char* const*>(argv), environ);
+  posix_spawn_file_actions_destroy(&actions);
+  close(fds[1]);
+  if (rc != 0) {
+    close(fds[0]);
+    return false;
+  }
+
+  auto deadline = std::chrono::steady_clock::now() + std::chrono::milliseconds(timeoutMs);
+  bool timedOut = false;
+  char buffer[4096];
+  for (;;) {
+    auto left = std::chrono::duration_cast<std::chrono::milliseconds>(deadline - std::chrono::steady_clock::now()).count();
+    if (left <= 0) {
+      timedOut = true;
+      break;
+    }
+    pollfd p{fds[0], POLLIN, 0};
+    int ready = poll(&p, 1, static_cast<int>(left));
+    if (ready < 0 && errno == EINTR) continue;
+    if (ready <= 0) {
+      timedOut = ready == 0;
+      break;
+    }
+    ssize_t got = read(fds[0], buffer, sizeof buffer);
+    if (got < 0 && errno == EINTR) continue;
+    if (got <= 0) break;
+    if (output.size() < kMaxHelperOutput) output.append(buffer, static_cast<std::size_t>(got));
+  }
+  close(fds[0]);
+  if (timedOut) kill(pid, SIGKILL);
+  // A helper may close its output and linger: the deadline holds here too.
+  int status = 0;
+  for (;;) {
+    pid_t r = waitpid(pid, &status, timedOut ? 0 : WNOHANG);
+    if (r == pid) break;
+    if (r < 0) {
+      if (errno == EINTR) continue;
+      return false;
+    }
+    if (std::chrono::steady_clock::now() >= deadline) {
+      kill(pid, SIGKILL);
+      timedOut = true;
+    } else {
+      usleep(5000);
+    }
+  }
+  return !timedOut && WIFEXITED(status) && WEXITSTATUS(status) == 0;
+}
+
+std::string FindExecutable(const std::string& path) {
+  if (path.empty() || access(path.c_str(), F_OK) != 0) return std::string();
+
+  std::string output;
+  const char* filetype[] = {"xdg-mime", "query", "filetype", path.c_str(), nullptr};
+  if (!RunAndCapture(filetype, output, kHelperTimeoutMs)) return std::string();
+  std::string mime = Trim(output);
+  if (mime.empty() || mime.find('\n') != std::string::npos) return std::string();
+
+  const char* query[] = {"xdg-mime", "query", "default", mime.c_str(), nullptr};
+  if (!RunAndCapture(query, output, kHelperTimeoutMs)) return std::string();
+  std::string id = Trim(output);
+  std::size_t newline = id.find('\n');
+  if (newline != std::string::npos) id = Trim(id.substr(0, newline));
+
+  std::string desktopFile = FindDesktopFile(id);
+  if (desktopFile.empty()) return std::string();
+  std::vector<std::string> words = SplitExec(ReadExecLine(desktopFile));
+  std::size_t first = 0;
+  if (first < words.size() && words[first] == "env") {
+    ++first;
+    while (first < words.size() && words[first].find('=') != std::string::npos) ++first;
+  }
+  if (first >= words.size()) return std::string();
+  return FindOnPath(words[first]);
+}
