@@ -23,3 +23,9 @@ class DocumentTreeView {
 
 int Fill_Tree(DocumentTreeView& tree);
 DocumentTreeView::Item AddDocumentNode(DocumentTreeView& tree, const char* name, int documentIndex);
+
+// One step of the insertion: `path` below `parent`; returns the leaf item.
+// Name parts are compared and inserted whole, whatever their length.
+DocumentTreeView::Item InsertPath(DocumentTreeView& tree, const char* path,
+                                  DocumentTreeView::Item root, DocumentTreeView::Item parent,
+                                  int documentIndex);

@@ -1,0 +1,219 @@
+// The document table: documents listed in [DOC] of the private INI file,
+// then one entry for every label of the word index.
+#include "catalogue/documents.h"
+
+#include <unistd.h>
+
+#include <cstdint>
+#include <cstring>
+#include <memory>
+#include <new>
+#include <string>
+#include <unordered_map>
+
+#include "catalogue/keywords.h"
+#include "platform/profile.h"
+#include "shell/settings.h"
+#include "shell/trace.h"
+#include "trovlib/trovlib.h"
+#include "wordindex/wordindex.h"
+
+DocumentEntry DocumentTable[kMaxDocuments];
+int DocumentCount = 0;
+
+namespace {
+
+constexpr const char* kDocumentCategory = "TeX system documentation";
+constexpr unsigned long kKeyListSize = 32000;
+constexpr unsigned long kValueSize = 64;
+constexpr unsigned long kSearchFlagSize = 32;
+constexpr const char* kTableFullMessage = "ERROR: Too many documents when try to add: ";
+
+std::string Folded(const std::string& text) {
+  std::string folded(text);
+  for (char& c : folded)
+    if (c >= 'A' && c <= 'Z') c = static_cast<char>(c - 'A' + 'a');
+  return folded;
+}
+
+std::string NameLanguageKey(const std::string& name, const std::string& language) {
+  return Folded(name) + '\0' + Folded(language);
+}
+
+// Finds duplicates by name without going through the whole table for every
+// new document; a catalogue of thousands would otherwise cost millions of
+// comparisons.  Entries appended straight into the table (the labels) are
+// taken in the next time it is asked.
+class DocumentLookup {
+ public:
+  void Clear() {
+    first_by_name_language_.clear();
+    last_by_name_.clear();
+    indexed_ = 0;
+  }
+
+  // Index of the first entry with this name and language, or -1.
+  int Find(const std::string& name, const std::string& language) {
+    Sync();
+    auto it = first_by_name_language_.find(NameLanguageKey(name, language));
+    if (it == first_by_name_language_.end()) return -1;
+    const DocumentEntry& entry = DocumentTable[it->second];
+    if (CompareIgnoringCase(entry.Name.c_str(), name.c_str()) != 0 ||
+        CompareIgnoringCase(entry.Language.c_str(), language.c_str()) != 0) {
+      // The table was changed behind our back: look again from scratch.
+      Clear();
+      return FindByScan(name, language);
+    }
+    return it->second;
+  }
+
+  // Index of the last entry before `before` with this name, or -1.
+  int FindLastByName(const std::string& name, int before) {
+    Sync();
+    auto it = last_by_name_.find(Folded(name));
+    if (it == last_by_name_.end() || it->second >= before) {
+      for (int i = before - 1; i >= 0; --i)
+        if (CompareIgnoringCase(DocumentTable[i].Name.c_str(), name.c_str()) == 0) return i;
+      return -1;
+    }
+    return it->second;
+  }
+
+ private:
+  void Sync() {
+    if (indexed_ > DocumentCount) Clear();
+    for (; indexed_ < DocumentCount; ++indexed_) {
+      const DocumentEntry& entry = DocumentTable[indexed_];
+      first_by_name_language_.emplace(NameLanguageKey(entry.Name, entry.Language), indexed_);
+      last_by_name_[Folded(entry.Name)] = indexed_;
+    }
+  }
+
+  int FindByScan(const std::string& name, const std::string& language) {
+    for (int i = 0; i < DocumentCount; ++i)
+      if (CompareIgnoringCase(DocumentTable[i].Name.c_str(), name.c_str()) == 0 &&
+          CompareIgnoringCase(DocumentTable[i].Language.c_str(), language.c_str()) == 0)
+        return i;
+    return -1;
+  }
+
+  std::unordered_map<std::string, int> first_by_name_language_;
+  std::unordered_map<std::string, int> last_by_name_;
+  int indexed_ = 0;
+};
+
+DocumentLookup g_lookup;
+
+int SearchModeOf(const char* name) {
+  char flag[kSearchFlagSize] = "Y";
+  if (const char* systemIni = TrovINIFile(1)) {
+    const std::string file(systemIni);
+    GetPrivateProfileStringA("Docuvane.Search", name, "Y", flag, sizeof flag, file.c_str());
+  }
+  int mode = (flag[0] == 'Y' || flag[0] == 'y') ? 1 : 0;
+  if (flag[0] == 'P' || flag[0] == 'p' || name[0] == '*') mode = 2;
+  return mode;
+}
+
+void AppendLabels() {
+  // LabelOffsets holds entries up to kMaxLabels + 1, whatever the header says.
+  const int labels = LabelCount < kMaxLabels ? LabelCount : kMaxLabels;
+  char label[kLabelBufferSize];
+  for (int k = 1; k <= labels; ++k) {
+    const int64_t length = static_cast<int64_t>(LabelOffsets[k + 1]) - LabelOffsets[k];
+    ReadIndexLabel(k, label, sizeof label);
+    if (length >= static_cast<int64_t>(kLabelBufferSize)) {
+      TraceMessage("WARNING: Word index label longer than 255 bytes skipped: ", label);
+      continue;
+    }
+    if (DocumentCount >= kMaxDocuments) {
+      // Said once: the labels after this one do not fit either.
+      TraceMessage(kTableFullMessage, label);
+      return;
+    }
+    DocumentEntry& entry = DocumentTable[DocumentCount++];
+    entry = DocumentEntry{};
+    entry.FileName = label;
+    entry.Path = label;
+    entry.Name = label;
+    for (char& c : entry.Name)
+      if (c == '/' || c == '\\') c = '>';
+    entry.Language = "ENG";
+  }
+}
+
+}  // namespace
+
+void Collect_Documents() {
+  std::unique_ptr<char[]> keys(new (std::nothrow) char[kKeyListSize]);
+  if (!keys) {
+    TraceMessage("ERROR: Not available memory to collect document list", "");
+    return;
+  }
+
+  for (int i = 0; i < DocumentCount; ++i) DocumentTable[i] = DocumentEntry{};
+  DocumentCount = 0;
+  g_lookup.Clear();
+
+  const unsigned long listLength =
+      GetPrivateProfileStringA("DOC", nullptr, "", keys.get(), kKeyListSize, IniFilePath.c_str());
+  keys[kKeyListSize - 1] = '\0';
+  const char* const end = keys.get() + (listLength < kKeyListSize ? listLength : kKeyListSize - 1);
+  char value[kValueSize];
+  for (const char* key = keys.get(); key < end && *key != '\0'; key += std::strlen(key) + 1) {
+    if (TraceMode != 0) TraceMessage("Collect Document:", key);
+    GetPrivateProfileStringA("DOC", key, "", value, sizeof value, IniFilePath.c_str());
+    if (value[0] == '\0') continue;
+
+    const char* found = TrovSearch(kDocumentCategory, value);
+    if (found == nullptr) {
+      if (TraceMode != 0) TraceMessage(value);
+      continue;
+    }
+    const std::string path(found);  // the library's string does not last
+    if (access(path.c_str(), F_OK) != 0) {
+      TraceMessage("ERROR: There is not Accesible Document file: ", path.c_str());
+      continue;
+    }
+    if (TraceMode != 0) TraceMessage("Attach document: ", path.c_str());
+    AddDocument(key, value, path.c_str(), "ENG");
+  }
+  keys.reset();
+
+  if (WordIndexHandle != nullptr && LabelCount >= 1) AppendLabels();
+}
+
+int AddDocument(const char* name, const char* fileName, const char* path, const char* language) {
+  if (name == nullptr) name = "";
+  if (fileName == nullptr) fileName = "";
+  if (path == nullptr) path = "";
+  if (language == nullptr) language = "";
+
+  const int listed = g_lookup.Find(name, language);
+  if (listed >= 0) return listed;
+
+  if (DocumentCount >= kMaxDocuments) {
+    TraceMessage(kTableFullMessage, name);
+    return -1;
+  }
+
+  const int n = DocumentCount;
+  const int sameAs = g_lookup.FindLastByName(name, n);
+  DocumentEntry& entry = DocumentTable[n];
+  entry = DocumentEntry{};
+  entry.Name = name;
+  entry.FileName = fileName;
+  entry.Path = path;
+  entry.Language = language;
+  ++DocumentCount;
+
+  // The same document in another language: the earlier entry stands for
+  // it, and this one gets no definition file of its own.
+  if (sameAs >= 0) {
+    entry.SameAs = sameAs;
+    return sameAs;
+  }
+
+  if (Load_Document_Index(n, 1) == 1) entry.SearchMode = SearchModeOf(name);
+  return n;
+}
