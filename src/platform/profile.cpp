@@ -115,8 +115,8 @@ unsigned long CopyList(const std::vector<const std::string*>& names, char* buffe
   }
   std::size_t pos = 0;
   for (const std::string* name : names) {
-    if (pos + name->size() + 1 > size - 2) {
-      std::size_t room = size - 2 - pos;
+    if (pos + name->size() + 1 > size - 1) {  // the final NUL needs the last byte
+      std::size_t room = pos < size - 2 ? size - 2 - pos : 0;
       std::memcpy(buffer + pos, name->data(), std::min(room, name->size()));
       buffer[size - 2] = '\0';
       buffer[size - 1] = '\0';
