@@ -1,0 +1,38 @@
+// The per-user instance lock: one running Docuvane per user.
+#pragma once
+
+#include <string>
+
+// An exclusive flock() on a file in the runtime directory.  The kernel drops
+// the lock when its holder ends in any way (SIGKILL included), so a lock
+// left by a dead instance never blocks the next start, whatever the file
+// holds.
+class InstanceLock {
+ public:
+  InstanceLock() = default;
+  ~InstanceLock();
+  InstanceLock(const InstanceLock&) = delete;
+  InstanceLock& operator=(const InstanceLock&) = delete;
+
+  // Tries to take the lock `name` in `directory` (empty: RuntimeDirectory()).
+  // Returns true when this object holds it.  When the lock file cannot be
+  // opened at all, an "ERROR: " message is emitted and false returned;
+  // IsAnotherRunning() then says false, so that the program still starts.
+  bool Create(const std::string& name, const std::string& directory = std::string());
+
+  // True when another process holds the lock.
+  bool IsAnotherRunning() const { return another_; }
+  // True when this object holds the lock.
+  bool HoldsLock() const { return fd_ >= 0; }
+  // Full path of the lock file (empty before Create).
+  const std::string& path() const { return path_; }
+
+  // Releases the lock (the file stays: removing it would let two starts lock
+  // two different files).
+  void Release();
+
+ private:
+  int fd_ = -1;
+  bool another_ = false;
+  std::string path_;
+};
