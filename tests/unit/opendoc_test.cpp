@@ -348,7 +348,9 @@ TEST_F(OpenDocTest, AcrobatRoute) {
       ASSERT_EQ(services.executed.size(), 1u) << row.what;
       EXPECT_EQ(services.executed[0], row.argv) << row.what;
       EXPECT_TRUE(capture.Contains(std::string("PDF Reader: ") + row.reader)) << row.what;
-      if (row.line) EXPECT_TRUE(capture.Contains(row.line)) << row.what;
+      if (row.line) {
+        EXPECT_TRUE(capture.Contains(row.line)) << row.what;
+      }
     }
   }
   FakeAccessServices services;
@@ -407,7 +409,9 @@ TEST_F(OpenDocTest, TemplateRoute) {
       EXPECT_EQ(services.executed[0], row.argv) << row.what;
     }
     EXPECT_EQ(services.defaultApplication.size(), row.defaultApp ? 1u : 0u) << row.what;
-    if (row.traced) EXPECT_TRUE(capture.Contains(row.traced)) << row.what;
+    if (row.traced) {
+      EXPECT_TRUE(capture.Contains(row.traced)) << row.what;
+    }
     EXPECT_EQ(capture.Contains("INFO: template(*) "), row.trace != 0) << row.what;
     EXPECT_EQ(capture.Contains("INFO: templ-sp: "), row.trace != 0 && !row.argv.empty()) << row.what;
   }
