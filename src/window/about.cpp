@@ -10,11 +10,7 @@
 #include <cctype>
 #include <string>
 
-#if __has_include("shell/app.h")
 #include "shell/app.h"
-#else
-static const char* AppTitle = "Lomari Docuvane";
-#endif
 #include "trovlib/trovlib.h"
 
 namespace {

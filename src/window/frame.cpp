@@ -9,8 +9,9 @@
 
 #include <cstdio>
 
-#if __has_include("access/start_page.h")
 #include "access/start_page.h"
+#if __has_include("access/desktop_services_gui.h")
+#include "access/desktop_services_gui.h"
 #define DOCUVANE_HAVE_START_PAGE 1
 #endif
 #include "catalogue/documents.h"
@@ -103,14 +104,19 @@ MyFrame::MyFrame(const wxString& title)
 }
 
 MyFrame::~MyFrame() {
-  wxConfigBase* config = wxConfigBase::Get();
-  if (!config || IsIconized()) return;
-  if (IsMaximized()) {
+  WriteFrameGeometry(wxConfigBase::Get(), IsIconized(), IsMaximized(), ToDIP(GetPosition()),
+                     ToDIP(GetSize()));
+}
+
+void WriteFrameGeometry(wxConfigBase* config, bool iconized, bool maximized, const wxPoint& position,
+                        const wxSize& size) {
+  // A minimized frame has no geometry worth keeping; a maximized one keeps
+  // the last normal geometry for the next start.
+  if (!config || iconized) return;
+  if (maximized) {
     config->Write("/MainWindow/Max", 1L);
     return;
   }
-  const wxPoint position = ToDIP(GetPosition());
-  const wxSize size = ToDIP(GetSize());
   config->Write("/MainWindow/x", static_cast<long>(position.x));
   config->Write("/MainWindow/y", static_cast<long>(position.y));
   config->Write("/MainWindow/w", static_cast<long>(size.x));
@@ -133,6 +139,7 @@ void MyFrame::OnHelp(wxCommandEvent&) {
 void MyFrame::OnInternet(wxCommandEvent&) {
   TrovMessage("INFO: MyFrame::OnInternet", "", 2);
 #ifdef DOCUVANE_HAVE_START_PAGE
-  OpenStartPage();
+  DesktopServices services(this);
+  OpenStartPage(services);
 #endif
 }

@@ -6,6 +6,7 @@
 #include <wx/gdicmn.h>
 
 class Docuvane;
+class wxConfigBase;
 
 class MyFrame : public wxFrame {
  public:
@@ -29,3 +30,9 @@ wxSize VirtualScreenSize();
 // Where a frame with the stored geometry (pixels) opens on a screen of the
 // given size: at least the default size, at most the screen, moved inside it.
 wxRect ClampFrameGeometry(const wxRect& stored, const wxSize& defaultSize, const wxSize& screen);
+
+// What closing stores under "/MainWindow" (position and size in DIPs):
+// nothing when minimized, only Max = 1 when maximized, else x, y, w, h and
+// Max = 0.
+void WriteFrameGeometry(wxConfigBase* config, bool iconized, bool maximized, const wxPoint& position,
+                        const wxSize& size);

@@ -118,7 +118,10 @@ Docuvane::Docuvane(wxWindow* parent, const wxPoint& pos, const wxSize& size) {
   // spacer; wxALIGN_RIGHT together with wxEXPAND is refused by the sizer.
   column->Add(buttonRow, 0, wxEXPAND | wxALL, kGap);
 
-  pane->SetSizerAndFit(column);
+  // Fit, without making the fitted size a minimum: the sash may then come
+  // within the minimum pane size of either edge.
+  pane->SetSizer(column);
+  column->Fit(pane);
 
   SplitVertically(m_tree, pane);
   SetMinimumPaneSize(20);
