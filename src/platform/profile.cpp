@@ -190,7 +190,11 @@ std::string ResolvePath(const char* file) {
   for (char& c : path)
     if (c == '\\') c = '/';
   if (path.find('/') != std::string::npos) return path;
-  const std::string& dir = SystemDirectory();
+  std::string dir;
+  {
+    std::lock_guard<std::mutex> lock(CacheMutex());
+    dir = SystemDirectory();
+  }
   std::string exact = dir + "/" + path;
   if (access(exact.c_str(), F_OK) == 0) return exact;
   if (DIR* handle = opendir(dir.c_str())) {

@@ -1,7 +1,6 @@
 // Docuvane_Init: the private INI file's Setup section and the word index.
 #include "shell/settings.h"
 
-#include <cerrno>
 #include <climits>
 #include <cstdlib>
 #include <cstring>
@@ -26,7 +25,6 @@ constexpr std::size_t kRootLimit = 255;  // characters of the formatted Root
 // atoi's reading (blanks, sign, digits up to the first other character),
 // without its undefined behaviour on numbers beyond int: those saturate.
 int ToInteger(const char* text) {
-  errno = 0;
   long value = std::strtol(text, nullptr, 10);
   if (value > INT_MAX) return INT_MAX;
   if (value < INT_MIN) return INT_MIN;
