@@ -25,8 +25,8 @@ constexpr int kLookups = 1000;
 struct Fixture {
   testing_support::TempDir dir;
   std::string path;
-  std::vector<std::string> words;       // as stored, in file order
-  std::vector<std::string> listed;      // the words the list keeps
+  std::vector<std::string> words;   // as stored, in file order
+  std::vector<std::string> listed;  // the words the list keeps
   Fixture() {
     uint64_t state = 0x9E3779B97F4A7C15ull;
     auto next = [&state] {
@@ -43,8 +43,10 @@ struct Fixture {
     while (made < kWords) {
       std::string word;
       const uint64_t kind = next() % 10;
-      if (kind < 6) word = "\\";
-      else if (kind < 8) word = "{";
+      if (kind < 6)
+        word = "\\";
+      else if (kind < 8)
+        word = "{";
       const int length = 2 + static_cast<int>(next() % 20);
       for (int i = 0; i < length; ++i) {
         const uint64_t r = next() % 60;
@@ -60,7 +62,8 @@ struct Fixture {
     if (!builder.Build(WordIndexBuilder::Form::Compact, bytes, error)) std::abort();
     path = dir / "command.Index";
     std::ofstream(path, std::ios::binary)
-        .write(reinterpret_cast<const char*>(bytes.data()), static_cast<std::streamsize>(bytes.size()));
+        .write(reinterpret_cast<const char*>(bytes.data()),
+               static_cast<std::streamsize>(bytes.size()));
     if (!OpenWordIndex(path.c_str())) std::abort();
     for (int L = MinWordLength; L <= MaxWordLength; ++L) {
       const int64_t count = (LengthOffsets[L + 1] - LengthOffsets[L]) / (L + 5);
@@ -81,13 +84,16 @@ Fixture& TheFixture() {
 }
 
 // Messages are not what is measured.
-void Quiet() { TrovSetMessageSink([](const char*, const char*, int) {}); }
+void Quiet() {
+  TrovSetMessageSink([](const char*, const char*, int) {});
+}
 
 void BM_OpenAndLookup1000(benchmark::State& state) {
   Fixture& f = TheFixture();
   Quiet();
   std::vector<const char*> probes;
-  for (int i = 0; i < kLookups; ++i) probes.push_back(f.words[(i * 7919u) % f.words.size()].c_str());
+  for (int i = 0; i < kLookups; ++i)
+    probes.push_back(f.words[(i * 7919u) % f.words.size()].c_str());
   for (auto _ : state) {
     if (!OpenWordIndex(f.path.c_str())) state.SkipWithError("open failed");
     int found = 0;

@@ -63,7 +63,8 @@ int Make(bool longForm, const char* listing, const char* indexPath) {
     return 1;
   }
   std::ofstream out(indexPath, std::ios::binary | std::ios::trunc);
-  out.write(reinterpret_cast<const char*>(bytes.data()), static_cast<std::streamsize>(bytes.size()));
+  out.write(reinterpret_cast<const char*>(bytes.data()),
+            static_cast<std::streamsize>(bytes.size()));
   out.close();
   if (!out) {
     std::cerr << "docuvane-mkindex: cannot write " << indexPath << "\n";

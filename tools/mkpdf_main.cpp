@@ -39,12 +39,15 @@ std::string Pdf(const std::string& title, int pages) {
   object("<< /Type /Pages /Kids [" + kids + "] /Count " + std::to_string(pages) + " >>");
   object("<< /Type /Font /Subtype /Type1 /BaseFont /Helvetica >>");
   for (int i = 0; i < pages; ++i) {
-    object("<< /Type /Page /Parent 2 0 R /MediaBox [0 0 612 792] /Resources << /Font << /F1 3 0 R "
-           ">> >> /Contents " +
-           std::to_string(5 + 2 * i) + " 0 R >>");
-    const std::string content = "BT /F1 24 Tf 72 700 Td " + Literal(title) + " Tj ET\nBT /F1 12 Tf 72 72 Td " +
+    object(
+        "<< /Type /Page /Parent 2 0 R /MediaBox [0 0 612 792] /Resources << /Font << /F1 3 0 R "
+        ">> >> /Contents " +
+        std::to_string(5 + 2 * i) + " 0 R >>");
+    const std::string content = "BT /F1 24 Tf 72 700 Td " + Literal(title) +
+                                " Tj ET\nBT /F1 12 Tf 72 72 Td " +
                                 Literal("Page " + std::to_string(i + 1)) + " Tj ET\n";
-    object("<< /Length " + std::to_string(content.size()) + " >>\nstream\n" + content + "endstream");
+    object("<< /Length " + std::to_string(content.size()) + " >>\nstream\n" + content +
+           "endstream");
   }
   const std::size_t xref = pdf.size();
   pdf += "xref\n0 " + std::to_string(offsets.size() + 1) + "\n0000000000 65535 f \n";
@@ -53,8 +56,9 @@ std::string Pdf(const std::string& title, int pages) {
     snprintf(line, sizeof line, "%010zu 00000 n \n", offset);
     pdf += line;
   }
-  pdf += "trailer\n<< /Size " + std::to_string(offsets.size() + 1) + " /Root 1 0 R /Info << /Title " +
-         Literal(title) + " >> >>\nstartxref\n" + std::to_string(xref) + "\n%%EOF\n";
+  pdf += "trailer\n<< /Size " + std::to_string(offsets.size() + 1) +
+         " /Root 1 0 R /Info << /Title " + Literal(title) + " >> >>\nstartxref\n" +
+         std::to_string(xref) + "\n%%EOF\n";
   return pdf;
 }
 

@@ -120,8 +120,8 @@ bool WordIndexBuilder::AddListing(std::istream& in, std::string& error) {
 bool WordIndexBuilder::Build(Form form, std::vector<uint8_t>& out, std::string& error) const {
   out.clear();
   // Words by length, each group in unsigned byte order (std::map's order).
-  std::vector<std::vector<const std::pair<const std::string, std::vector<IndexLocation>>*>> byLength(
-      kMaxIndexWordLength + 1);
+  std::vector<std::vector<const std::pair<const std::string, std::vector<IndexLocation>>*>>
+      byLength(kMaxIndexWordLength + 1);
   int minLength = 256;
   int maxLength = -1;
   for (const auto& entry : words_) {
@@ -242,8 +242,8 @@ bool DumpWordIndex(std::ostream& out, int& skipped) {
       unsigned char record[260];
       if (!ReadIndexBytes(LengthOffsets[L] + i * size, record, L + 4)) return false;
       const std::string text(reinterpret_cast<char*>(record), L);
-      const int64_t offset = (int64_t{record[L]} << 24) | (record[L + 1] << 16) |
-                             (record[L + 2] << 8) | record[L + 3];
+      const int64_t offset =
+          (int64_t{record[L]} << 24) | (record[L + 1] << 16) | (record[L + 2] << 8) | record[L + 3];
       unsigned char header[4];
       if (!ReadIndexBytes(offset, header, 4)) return false;
       const int64_t entriesAt = offset + 4 + header[0];

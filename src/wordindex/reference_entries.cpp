@@ -11,8 +11,10 @@ std::vector<ReferenceLocation> DecodeReferenceEntries(const unsigned char* entri
     // is a page of the location last started.
     for (std::size_t i = 0; i + 2 <= size; i += 2) {
       const int entry = (entries[i] << 8) | entries[i + 1];
-      if (entry & 0x8000) locations.push_back({entry & 0x7FFF, {}});
-      else if (!locations.empty()) locations.back().pages.push_back(entry);
+      if (entry & 0x8000)
+        locations.push_back({entry & 0x7FFF, {}});
+      else if (!locations.empty())
+        locations.back().pages.push_back(entry);
     }
   } else {
     // Long form: label index and page per entry; a change of label index

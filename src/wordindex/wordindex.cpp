@@ -105,8 +105,7 @@ int ReadHeader(FILE* f, const char* path) {
   uint32_t labelOffsets[kMaxLabels + 2];
   for (int k = 1; k <= labels + 1; ++k) {
     uint32_t offset = BigEndian(&labelTable[static_cast<std::size_t>(k - 1) * 3], 3);
-    if (offset > static_cast<uint64_t>(size))
-      return fail("Label offset outside Word Index file: ");
+    if (offset > static_cast<uint64_t>(size)) return fail("Label offset outside Word Index file: ");
     if (k > 1 && offset < labelOffsets[k - 1])
       return fail("Label offsets out of order in Word Index file: ");
     labelOffsets[k] = offset;
@@ -191,8 +190,10 @@ int32_t FindIndexWord(const char* word) {
       if (offset == 0 || static_cast<int64_t>(offset) + 4 > WordIndexSize) return 0;
       return static_cast<int32_t>(offset);
     }
-    if (order < 0) hi = mid;
-    else lo = mid;
+    if (order < 0)
+      hi = mid;
+    else
+      lo = mid;
     if (hi - lo <= 1) return 0;
   }
 }

@@ -44,7 +44,9 @@ bool StartsWithFolded(const char* word, const char* text, std::size_t n) {
 
 }  // namespace
 
-int CompareIndexWords(const char* a, const char* b) { return CompareFolded(DropLead(a), DropLead(b)); }
+int CompareIndexWords(const char* a, const char* b) {
+  return CompareFolded(DropLead(a), DropLead(b));
+}
 
 int Fill_WordIndex(WordListData& data) {
   const unsigned long start = GetTickCount();
@@ -73,7 +75,8 @@ int Fill_WordIndex(WordListData& data) {
   char* area = data.RecordBuffer.get();
   for (int L = MinWordLength; L <= MaxWordLength; ++L) {
     const std::size_t size = static_cast<std::size_t>(L) + 5;
-    const std::size_t count = static_cast<std::size_t>(LengthOffsets[L + 1] - LengthOffsets[L]) / size;
+    const std::size_t count =
+        static_cast<std::size_t>(LengthOffsets[L + 1] - LengthOffsets[L]) / size;
     char* record = area + (LengthOffsets[L] - areaStart);
     for (std::size_t i = 0; i < count; ++i, record += size) {
       record[L] = '\0';
@@ -82,13 +85,16 @@ int Fill_WordIndex(WordListData& data) {
         continue;
       }
       data.Words.push_back(record);
-      if (record[0] == '\\') ++CommandWordCount;
-      else if (record[0] == '{') ++EnvironmentWordCount;
+      if (record[0] == '\\')
+        ++CommandWordCount;
+      else if (record[0] == '{')
+        ++EnvironmentWordCount;
     }
   }
 
-  std::sort(data.Words.begin(), data.Words.end(),
-            [](const char* a, const char* b) { return CompareFolded(DropLead(a), DropLead(b)) < 0; });
+  std::sort(data.Words.begin(), data.Words.end(), [](const char* a, const char* b) {
+    return CompareFolded(DropLead(a), DropLead(b)) < 0;
+  });
 
   char elapsed[32];
   snprintf(elapsed, sizeof elapsed, "%d ms", static_cast<int>(GetTickCount() - start));

@@ -64,7 +64,8 @@ inline int FuzzWordIndexInput(const uint8_t* data, size_t size) {
       std::vector<char> buffer(bufferSize + 1, '\x5a');
       const int n = ReadIndexLabel(k, buffer.data(), bufferSize);
       if (buffer[bufferSize] != '\x5a') __builtin_trap();
-      if (n < 0 || static_cast<std::size_t>(n) >= bufferSize || std::strlen(buffer.data()) != static_cast<std::size_t>(n))
+      if (n < 0 || static_cast<std::size_t>(n) >= bufferSize ||
+          std::strlen(buffer.data()) != static_cast<std::size_t>(n))
         __builtin_trap();
     }
   }

@@ -61,13 +61,12 @@ TEST(MkIndexTool, WorkedExampleBytes) {
 
 TEST(MkIndexTool, LongFormAndDumpRoundTrip) {
   TempDir dir;
-  const std::string listing = dir.Write(
-      "in.listing",
-      "\\section\tlatex/base/usrguide.pdf\t12 15\r\n"
-      "{align}\tlatex/amsmath/amsldoc.pdf\t3\n"
-      "\n"
-      "\\section\tlatex/base/clsguide.pdf\t4\n"
-      "\\@ifnextchar\tlatex/base/clsguide.pdf\t9 10\n");
+  const std::string listing = dir.Write("in.listing",
+                                        "\\section\tlatex/base/usrguide.pdf\t12 15\r\n"
+                                        "{align}\tlatex/amsmath/amsldoc.pdf\t3\n"
+                                        "\n"
+                                        "\\section\tlatex/base/clsguide.pdf\t4\n"
+                                        "\\@ifnextchar\tlatex/base/clsguide.pdf\t9 10\n");
   for (const char* form : {"", "--long "}) {
     const std::string index = dir / "out.Index";
     Result r = RunTool(dir, form + Quote(listing) + " " + Quote(index));

@@ -1,4 +1,6 @@
 // Keyword targets of a word as Locations items.
+#include "wordindex/references.h"
+
 #include <gtest/gtest.h>
 
 #include <string>
@@ -7,7 +9,6 @@
 #include "catalogue/documents.h"
 #include "catalogue/keywords.h"
 #include "test_support.h"
-#include "wordindex/references.h"
 
 namespace {
 
@@ -37,7 +38,7 @@ TEST_F(KeywordTargetsTest, ItemsNewestFirstWithTheSingleTarget) {
   AddKeywordTarget("\\section", "sec:1", 0);  // t1
   AddKeywordTarget("\\section", "sec:2", 1);  // t2
   AddKeywordTarget("{align}", "eq", 1);
-  AddKeywordTarget("\\bad", "gone", 7);       // no such document
+  AddKeywordTarget("\\bad", "gone", 7);  // no such document
   AddKeywordTarget("\\bad", "kept", 0);
   AddKeywordTarget("\\long", std::string(20, 'a').c_str(), 2);  // 134 characters
   AddKeywordTarget("\\fits", std::string(13, 'a').c_str(), 2);  // 127 characters

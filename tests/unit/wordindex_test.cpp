@@ -163,8 +163,8 @@ TEST_F(WordIndexTest, LabelReadKeepsTheStreamPosition) {
     std::size_t size;
     const char* expected;
   };
-  const Row rows[] = {{1, 256, "doc/first.pdf"}, {1, 4, "doc"}, {0, 256, ""}, {3, 256, ""},
-                      {-1, 256, ""}};
+  const Row rows[] = {
+      {1, 256, "doc/first.pdf"}, {1, 4, "doc"}, {0, 256, ""}, {3, 256, ""}, {-1, 256, ""}};
   for (const Row& row : rows) {
     std::vector<char> buffer(row.size, 'z');
     EXPECT_EQ(ReadIndexLabel(row.index, buffer.data(), row.size),
@@ -288,16 +288,31 @@ TEST_F(WordIndexTest, DamagedReferenceBlocks) {
   const auto compact = WordIndexBuilder::Form::Compact;
   const auto longForm = WordIndexBuilder::Form::Long;
   const Row rows[] = {
-      {"compact label 0 drops its pages", compact, {0x80, 0x00, 0x00, 0x0C}, {"b.pdf#page=2 "}, 1,
+      {"compact label 0 drops its pages",
+       compact,
+       {0x80, 0x00, 0x00, 0x0C},
+       {"b.pdf#page=2 "},
+       1,
        "no label"},
       {"compact label above LabelCount", compact, {0x80, 0x04}, {"b.pdf#page=2 "}, 1, "no label"},
-      {"long label 0 first: pages dropped", longForm, {0x00, 0x00, 0x00, 0x0C},
-       {"a.pdf#page=15 ", "b.pdf#page=2 "}, 2, nullptr},
-      {"long label above LabelCount", longForm, {0x00, 0x03, 0x00, 0x0C, 0x7F, 0xFF, 0x00, 0x0F},
-       {"a.pdf#page=12 ", "b.pdf#page=2 "}, 2, "no label"},
-      {"long label returning starts a second item", longForm,
+      {"long label 0 first: pages dropped",
+       longForm,
+       {0x00, 0x00, 0x00, 0x0C},
+       {"a.pdf#page=15 ", "b.pdf#page=2 "},
+       2,
+       nullptr},
+      {"long label above LabelCount",
+       longForm,
+       {0x00, 0x03, 0x00, 0x0C, 0x7F, 0xFF, 0x00, 0x0F},
+       {"a.pdf#page=12 ", "b.pdf#page=2 "},
+       2,
+       "no label"},
+      {"long label returning starts a second item",
+       longForm,
        {0x00, 0x03, 0x00, 0x0C, 0x00, 0x01, 0x00, 0x0F, 0x00, 0x03, 0x00, 0x02},
-       {"a.pdf#page=12 ", "b.pdf#page=15 ", "a.pdf#page=2 "}, 3, nullptr},
+       {"a.pdf#page=12 ", "b.pdf#page=15 ", "a.pdf#page=2 "},
+       3,
+       nullptr},
   };
   for (const Row& row : rows) {
     std::vector<uint8_t> bytes = BuildIndex(listing, row.form);
@@ -328,9 +343,9 @@ TEST_F(WordIndexTest, LabelMismatchLeavesTheListAlone) {
 TEST_F(WordIndexTest, EntryListReachingPastTheEndIsCut) {
   // A hand-laid file whose only block is last: S claims 0xFFFFFF bytes but
   // only one label start and one page follow.
-  std::vector<uint8_t> bytes = {'W', 'X', 1, 1, 0, 0, 0, 20, 0, 0, 0, 26, 0, 1, 0, 0, 26, 0, 0,
-                                27, 'w', 0, 0, 0, 27, 0, 'x', 1, 0xFF, 0xFF, 0xFF, 'w', 0x80,
-                                0x01, 0x00, 0x09, 0x00};
+  std::vector<uint8_t> bytes = {'W', 'X', 1,    1,    0,    0,   0,    20,   0,    0,    0,   26, 0,
+                                1,   0,   0,    26,   0,    0,   27,   'w',  0,    0,    0,   27, 0,
+                                'x', 1,   0xFF, 0xFF, 0xFF, 'w', 0x80, 0x01, 0x00, 0x09, 0x00};
   ASSERT_TRUE(Open(bytes));
   ASSERT_EQ(FindIndexWord("w"), 27);
   std::vector<std::string> items;

@@ -84,8 +84,11 @@ TEST(CompareIndexWordsTest, IgnoresOneLeadingMarkAndCase) {
   };
   const Row rows[] = {
       {"{align}", "\\alpha", -1},  // align} < alpha
-      {"\\alpha", "Alpha", 0},     {"\\\\x", "\\x", -1},    // only one mark dropped
-      {"{{a", "a", 1},            {"Zeta", "alpha", 1},    {"a", "ab", -1},
+      {"\\alpha", "Alpha", 0},
+      {"\\\\x", "\\x", -1},  // only one mark dropped
+      {"{{a", "a", 1},
+      {"Zeta", "alpha", 1},
+      {"a", "ab", -1},
       {"\xE9", "z", 1},  // unsigned bytes
       {"[", "a", -1},    // '[' sorts before folded letters
   };
@@ -96,7 +99,7 @@ TEST(CompareIndexWordsTest, IgnoresOneLeadingMarkAndCase) {
 }
 
 TEST(FindWordInListTest, PrefixAndExactSearch) {
-  const std::vector<const char*> words = {"{align}", "\\alpha", "\\Section", "\\section",
+  const std::vector<const char*> words = {"{align}",   "\\alpha",   "\\Section", "\\section",
                                           "sectional", "{section}", "sec"};
   struct Row {
     const char* text;
