@@ -34,3 +34,6 @@ class DesktopAccessServices : public AccessServices {
  private:
   wxWindow* parent_;
 };
+
+// Shorter name used by the window code.
+using DesktopServices = DesktopAccessServices;
