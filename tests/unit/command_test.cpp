@@ -244,9 +244,13 @@ TEST_F(ProcessCommandTest, Traces) {
     FakePanel panel;
     ProcessCommand(panel, row.command, 1);
     EXPECT_EQ(capture.Contains("Received Command: "), row.received != nullptr) << row.what;
-    if (row.received) EXPECT_TRUE(capture.Contains(row.received)) << row.what;
+    if (row.received) {
+      EXPECT_TRUE(capture.Contains(row.received)) << row.what;
+    }
     EXPECT_EQ(capture.Contains("Search Keyword: "), row.keyword != nullptr) << row.what;
-    if (row.keyword) EXPECT_TRUE(capture.Contains(row.keyword)) << row.what;
+    if (row.keyword) {
+      EXPECT_TRUE(capture.Contains(row.keyword)) << row.what;
+    }
   }
 }
 

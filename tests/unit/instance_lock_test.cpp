@@ -1,6 +1,7 @@
 // The per-user instance lock.
 #include "platform/instance_lock.h"
 
+#include <fcntl.h>
 #include <signal.h>
 #include <sys/stat.h>
 #include <sys/wait.h>
@@ -102,12 +103,19 @@ TEST(InstanceLock, ProgramsStartedByTheHolderDoNotKeepIt) {
   TempDir dir;
   InstanceLock lock;
   ASSERT_TRUE(lock.Create(kName, dir.path()));
+  // The pipe closes in the child when exec has happened.
+  int execed[2];
+  ASSERT_EQ(pipe2(execed, O_CLOEXEC), 0);
   const pid_t viewer = fork();
   if (viewer == 0) {
     execl("/bin/sleep", "sleep", "30", static_cast<char*>(nullptr));
     _exit(127);
   }
   ASSERT_GT(viewer, 0);
+  close(execed[1]);
+  char byte;
+  ASSERT_EQ(read(execed[0], &byte, 1), 0);
+  close(execed[0]);
   lock.Release();
 
   InstanceLock next;
