@@ -2,11 +2,8 @@
 // or the open command on the selected item.
 #include <wx/treectrl.h>
 
-#if __has_include("access/tree_activation.h") && __has_include("access/desktop_services_gui.h")
 #include "access/desktop_services_gui.h"
 #include "access/tree_activation.h"
-#define DOCUVANE_HAVE_OPEN 1
-#endif
 #include "trovlib/trovlib.h"
 #include "window/panel.h"
 
@@ -17,10 +14,7 @@ void Docuvane::OnTreeActivate(wxTreeEvent& event) {
     TrovMessage("ERROR: Docuvane::OnTreeActivate ", "invalid wxTreeItemId", 5);
     return;
   }
-#ifdef DOCUVANE_HAVE_OPEN
-  DesktopServices services(this);
-  Open_Document(services, item.GetID());
-#endif
+  Open_Document(item);
 }
 
 void Docuvane::OnOpenDoc(wxCommandEvent&) {
@@ -30,8 +24,12 @@ void Docuvane::OnOpenDoc(wxCommandEvent&) {
     TrovMessage("ERROR: Docuvane::OnOpenDoc ", "invalid wxTreeItemId", 5);
     return;
   }
-#ifdef DOCUVANE_HAVE_OPEN
-  DesktopServices services(this);
-  Open_Document(services, item.GetID());
-#endif
+  Open_Document(item);
+}
+
+int Docuvane::Open_Document(const wxTreeItemId& item) {
+  // The table lookup, the traces and the opening live in OpenTreeDocument,
+  // which refuses an invalid item with its own message.
+  DesktopAccessServices services(this);
+  return OpenTreeDocument(services, item.IsOk() ? item.GetID() : nullptr);
 }

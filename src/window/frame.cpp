@@ -10,10 +10,7 @@
 #include <cstdio>
 
 #include "access/start_page.h"
-#if __has_include("access/desktop_services_gui.h")
 #include "access/desktop_services_gui.h"
-#define DOCUVANE_HAVE_START_PAGE 1
-#endif
 #include "catalogue/documents.h"
 #include "docuvane_icons.h"
 #include "shell/trace.h"
@@ -138,8 +135,6 @@ void MyFrame::OnHelp(wxCommandEvent&) {
 
 void MyFrame::OnInternet(wxCommandEvent&) {
   TrovMessage("INFO: MyFrame::OnInternet", "", 2);
-#ifdef DOCUVANE_HAVE_START_PAGE
-  DesktopServices services(this);
+  DesktopAccessServices services(this);
   OpenStartPage(services);
-#endif
 }

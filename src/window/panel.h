@@ -42,6 +42,8 @@ class Docuvane : public wxSplitterWindow {
   // Document tree (access/tree_handlers_gui.cpp).
   void OnTreeActivate(wxTreeEvent& event);
   void OnOpenDoc(wxCommandEvent& event);
+  // Opens the document that `item` shows; 0 when it shows none.
+  int Open_Document(const wxTreeItemId& item);
   // Layout.
   void OnSashMove(wxSplitterEvent& event);
 

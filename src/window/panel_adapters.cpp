@@ -3,10 +3,7 @@
 #include <wx/srchctrl.h>
 #include <wx/treectrl.h>
 
-#if __has_include("access/opendoc_gui.h")
 #include "access/opendoc_gui.h"
-#define DOCUVANE_HAVE_OPEN 1
-#endif
 #include "catalogue/tree.h"
 #include "command/command.h"
 #include "window/panel.h"
@@ -32,12 +29,7 @@ class PanelCommands : public CommandPanel {
     Show_Topic(panel_, word, openIfSingle);
   }
   int OpenDocument(const char* path, const char* anchor) override {
-#ifdef DOCUVANE_HAVE_OPEN
     return OpenDocumentFile(panel_, path, anchor);
-#else
-    (void)path, (void)anchor;
-    return 0;
-#endif
   }
 
  private:

@@ -9,10 +9,7 @@
 #include <string>
 #include <vector>
 
-#if __has_include("access/opendoc_gui.h")
 #include "access/opendoc_gui.h"
-#define DOCUVANE_HAVE_OPEN 1
-#endif
 #include "catalogue/documents.h"
 #include "catalogue/keywords.h"
 #include "trovlib/trovlib.h"
@@ -24,15 +21,6 @@
 wxTreeItemId HighlightedItem;
 
 namespace {
-
-int OpenLocation(wxWindow* parent, const char* name, const char* anchor) {
-#ifdef DOCUVANE_HAVE_OPEN
-  return OpenDocumentFile(parent, name, anchor);
-#else
-  (void)parent, (void)name, (void)anchor;
-  return 0;
-#endif
-}
 
 // Location texts are 8-bit in the locale's encoding; a text that does not
 // convert (a stray byte in a label) is shown byte for byte rather than lost.
@@ -78,7 +66,7 @@ void Show_Topic(Docuvane* panel, const char* word, int openIfSingle) {
     locations->SetSelection(0);
   }
   if (openIfSingle && targets.single)
-    OpenLocation(panel, targets.singlePath.c_str(), targets.singleAnchor.c_str());
+    OpenDocumentFile(panel, targets.singlePath.c_str(), targets.singleAnchor.c_str());
 
   if (WordIndexHandle) {
     const int32_t offset = FindIndexWord(word);
@@ -162,7 +150,7 @@ void Docuvane::OnTargetActivate(wxCommandEvent&) {
     TrovMessage("WARNING: Docuvane::OnTargetActivate ", "no selection in index", 4);
     return;
   }
-  OpenLocation(this, text.c_str(), nullptr);
+  OpenDocumentFile(this, text.c_str(), nullptr);
 }
 
 void Docuvane::OnGotoTarget(wxCommandEvent&) {
@@ -171,5 +159,5 @@ void Docuvane::OnGotoTarget(wxCommandEvent&) {
   const std::string text = SelectedLocation(this, &row);
   if (row == wxNOT_FOUND) return;
   TrovMessage("INFO: Docuvane::OnGotoTarget ", text.c_str(), 3);
-  OpenLocation(this, text.c_str(), nullptr);
+  OpenDocumentFile(this, text.c_str(), nullptr);
 }

@@ -6,6 +6,7 @@
 #include <wx/dialog.h>
 #include <wx/listbox.h>
 #include <wx/srchctrl.h>
+#include <wx/timer.h>
 #include <wx/treectrl.h>
 
 #include "gui_support.h"
@@ -223,24 +224,28 @@ TEST_F(LookupTest, HelpAndInternetButtonsReachTheFrame) {
   EXPECT_EQ(messages.LevelOf("INFO: MyFrame::OnInternet"), 2);
 }
 
-TEST_F(LookupTest, AboutButtonShowsTheModalDialog) {
-  // The dialog runs its own loop; close it from there once it is up.
+// Ends the About dialog's modal loop from inside it, once it is up.
+class AboutCloser : public wxTimer {
+ public:
   bool shown = false;
-  const auto giveUp = std::chrono::steady_clock::now() + std::chrono::seconds(10);
-  std::function<void()> closeWhenUp = [&] {
+  void Notify() override {
     for (wxWindow* w : wxTopLevelWindows) {
       auto* about = dynamic_cast<AboutDlg*>(w);
       if (about && about->IsModal()) {
         shown = true;
         about->EndModal(wxID_CANCEL);
-        return;
+        Stop();
       }
     }
-    if (std::chrono::steady_clock::now() < giveUp) wxTheApp->CallAfter(closeWhenUp);
-  };
-  wxTheApp->CallAfter(closeWhenUp);
+  }
+};
+
+TEST_F(LookupTest, AboutButtonShowsTheModalDialog) {
+  AboutCloser closer;
+  closer.Start(50);
   Click(wxWindow::FindWindowById(wxID_ABOUT, frame));
-  EXPECT_TRUE(WaitFor([&] { return shown; }));
+  EXPECT_TRUE(WaitFor([&] { return closer.shown; }));
+  closer.Stop();
   Flush();
   for (wxWindow* w : wxTopLevelWindows) EXPECT_EQ(dynamic_cast<AboutDlg*>(w), nullptr) << "destroyed";
 }
