@@ -14,19 +14,29 @@ namespace {
 // process.  Errors are ignored while we talk to the server.
 int IgnoreXError(Display*, XErrorEvent*) { return 0; }
 
+// One connection serves every call: a second start raises the window with
+// three or four calls in a row, and each new connection costs a round of
+// authentication.  It stays open until the process ends.
+Display* SharedDisplay() {
+  static Display* display = [] () -> Display* {
+    const char* name = std::getenv("DISPLAY");
+    if (name == nullptr || *name == '\0') return nullptr;
+    return XOpenDisplay(nullptr);
+  }();
+  return display;
+}
+
+// Our error handler while we talk to the server; the toolkit's own handler
+// is put back afterwards.
 class XSession {
  public:
-  XSession() {
-    const char* name = std::getenv("DISPLAY");
-    if (name == nullptr || *name == '\0') return;
-    display_ = XOpenDisplay(nullptr);
+  XSession() : display_(SharedDisplay()) {
     if (display_ != nullptr) previous_ = XSetErrorHandler(IgnoreXError);
   }
   ~XSession() {
     if (display_ == nullptr) return;
     XSync(display_, False);
     XSetErrorHandler(previous_);
-    XCloseDisplay(display_);
   }
   XSession(const XSession&) = delete;
   XSession& operator=(const XSession&) = delete;
