@@ -73,6 +73,54 @@ TEST(Startup, SecondStartWithoutArgumentsSendsAnEmptyCommand) {
   first.Stop();
 }
 
+// The window id the instance registered, or 0.
+unsigned long RegisteredWindow(const Sandbox& box) {
+  std::ifstream in(box.runtimeDir() + "/window-Docuvane");
+  unsigned long id = 0;
+  in >> id;
+  return id;
+}
+
+TEST(Startup, RegisteredWindowIsTheMainFrame) {
+  Sandbox box;
+  Process first = box.StartInstance();
+  const unsigned long id = RegisteredWindow(box);
+  ASSERT_NE(id, 0u);
+  const std::string command = "xprop -id " + std::to_string(id) + " WM_NAME 2>&1";
+  FILE* pipe = popen(command.c_str(), "r");
+  ASSERT_NE(pipe, nullptr);
+  char buffer[512] = {0};
+  const std::size_t n = fread(buffer, 1, sizeof buffer - 1, pipe);
+  pclose(pipe);
+  EXPECT_NE(std::string(buffer, n).find("\"Lomari Docuvane\""), std::string::npos) << buffer;
+  first.Stop();
+}
+
+TEST(Startup, SecondStartWithAStaleWindowRegistryStillForwards) {
+  struct Row {
+    const char* what;
+    const char* content;  // NULL: no registration at all
+  };
+  const Row rows[] = {{"no window registered", nullptr},
+                      {"a window that no longer exists", "4194303\n"},
+                      {"garbage", "not a window\n"}};
+  Sandbox box;
+  Process first = box.StartInstance();
+  int sent = 0;
+  for (const Row& row : rows) {
+    const std::string file = box.runtimeDir() + "/window-Docuvane";
+    std::filesystem::remove(file);
+    if (row.content) std::ofstream(file) << row.content;
+    Process second = box.Run({"stale" + std::to_string(++sent)});
+    EXPECT_EQ(second.status, 255) << row.what << Describe(second.Log());
+    EXPECT_TRUE(WaitFor([&] {
+      return CountLines(first.Log(), "INFO: DDE server Execute stale" + std::to_string(sent)) == 1;
+    })) << row.what;
+  }
+  EXPECT_TRUE(first.Running());
+  first.Stop();
+}
+
 TEST(Startup, ServerFailureLeavesTheProgramRunning) {
   // A runtime directory so deep that the socket path exceeds what the
   // kernel takes: the channel is refused, the window still comes up.
