@@ -10,6 +10,7 @@
 #include <new>
 #include <string>
 #include <unordered_map>
+#include <vector>
 
 #include "catalogue/keywords.h"
 #include "platform/profile.h"
@@ -115,13 +116,37 @@ int SearchModeOf(const char* name) {
   return mode;
 }
 
+// The label strings lie back to back (their offsets never decrease), so
+// they are read in one piece rather than with a seek and a read for each.
+// Empty when that piece cannot be read; the labels are then read one by one.
+std::string ReadLabelArea(int labels) {
+  const int64_t first = LabelOffsets[1];
+  const int64_t size = static_cast<int64_t>(LabelOffsets[labels + 1]) - first;
+  std::string area;
+  if (size <= 0 || size > WordIndexSize) return area;
+  area.resize(static_cast<std::size_t>(size));
+  if (!ReadIndexBytes(first, &area[0], area.size())) area.clear();
+  return area;
+}
+
 void AppendLabels() {
   // LabelOffsets holds entries up to kMaxLabels + 1, whatever the header says.
   const int labels = LabelCount < kMaxLabels ? LabelCount : kMaxLabels;
-  char label[kLabelBufferSize];
+  const std::string area = ReadLabelArea(labels);
+  char buffer[kLabelBufferSize];
   for (int k = 1; k <= labels; ++k) {
     const int64_t length = static_cast<int64_t>(LabelOffsets[k + 1]) - LabelOffsets[k];
-    ReadIndexLabel(k, label, sizeof label);
+    const int64_t at = static_cast<int64_t>(LabelOffsets[k]) - LabelOffsets[1];
+    const int64_t n = length < static_cast<int64_t>(sizeof buffer) - 1
+                          ? length
+                          : static_cast<int64_t>(sizeof buffer) - 1;
+    if (at >= 0 && n >= 0 && at + n <= static_cast<int64_t>(area.size())) {
+      std::memcpy(buffer, area.data() + at, static_cast<std::size_t>(n));
+      buffer[n] = '\0';
+    } else {
+      ReadIndexLabel(k, buffer, sizeof buffer);
+    }
+    const char* label = buffer;
     if (length >= static_cast<int64_t>(kLabelBufferSize)) {
       TraceMessage("WARNING: Word index label longer than 255 bytes skipped: ", label);
       continue;
@@ -157,10 +182,12 @@ void Collect_Documents() {
 
   const unsigned long listLength =
       GetPrivateProfileStringA("DOC", nullptr, "", keys.get(), kKeyListSize, IniFilePath.c_str());
-  keys[kKeyListSize - 1] = '\0';
-  const char* const end = keys.get() + (listLength < kKeyListSize ? listLength : kKeyListSize - 1);
+  // A list that fills the buffer was cut: the documents after it are lost.
+  bool cut = false;
+  const std::vector<const char*> names = SplitKeyList(keys.get(), listLength, kKeyListSize, cut);
+  if (cut) TraceMessage("WARNING: [DOC] key list cut at 32000 bytes in ", IniFilePath.c_str());
   char value[kValueSize];
-  for (const char* key = keys.get(); key < end && *key != '\0'; key += std::strlen(key) + 1) {
+  for (const char* key : names) {
     if (TraceMode != 0) TraceMessage("Collect Document:", key);
     GetPrivateProfileStringA("DOC", key, "", value, sizeof value, IniFilePath.c_str());
     if (value[0] == '\0') continue;

@@ -136,11 +136,12 @@ void LoadKeywords(const char* definitionPath, int documentIndex) {
   const unsigned long listLength = GetPrivateProfileStringA(kKeywordsSection, nullptr, "",
                                                             keys.get(), kKeyListSize,
                                                             definitionPath);
-  keys[kKeyListSize - 1] = '\0';
-  const char* const end = keys.get() + (listLength < kKeyListSize ? listLength : kKeyListSize - 1);
+  bool cut = false;
+  const std::vector<const char*> names = SplitKeyList(keys.get(), listLength, kKeyListSize, cut);
+  if (cut) TraceMessage("WARNING: [Keywords] key list cut at 32000 bytes in ", definitionPath);
   std::vector<char> keyword;
   char value[kValueSize];
-  for (const char* key = keys.get(); key < end && *key != '\0'; key += std::strlen(key) + 1) {
+  for (const char* key : names) {
     // Decoding never lengthens a key, so a buffer of its size takes it all
     // and shows whether the keyword is too long to keep.
     keyword.resize(std::strlen(key) + 1);
@@ -164,6 +165,21 @@ void LoadKeywords(const char* definitionPath, int documentIndex) {
       piece = hash + 1;
     }
   }
+}
+
+std::vector<const char*> SplitKeyList(const char* list, unsigned long length, unsigned long size,
+                                      bool& cut) {
+  std::vector<const char*> names;
+  cut = size >= 2 && length >= size - 2;
+  if (size == 0) return names;
+  const char* const end = list + (length < size ? length : size - 1);
+  for (const char* name = list; name < end && *name != '\0';) {
+    const std::size_t n = strnlen(name, static_cast<std::size_t>(end - name));
+    if (cut && name + n >= end) break;  // cut short by the buffer
+    names.push_back(name);
+    name += n + 1;
+  }
+  return names;
 }
 
 void AddKeywordTarget(const char* keyword, const char* anchor, int documentIndex) {

@@ -3,6 +3,7 @@
 
 #include <cstddef>
 #include <string>
+#include <vector>
 
 struct KeywordTarget {
   KeywordTarget* Next;  // next (older) target
@@ -35,6 +36,12 @@ int CompareIgnoringCase(const char* a, const char* b);
 // of the file's own name (not of a directory) and ".ddf" appended.
 // The file name is first cut to 127 bytes.
 std::string DefinitionFileName(const char* fileName);
+
+// The names of a key list that the profile API put into a buffer of `size`
+// bytes (`length` is what the call returned).  A list that filled the
+// buffer was cut: `cut` is set and its last, partial name is left out.
+std::vector<const char*> SplitKeyList(const char* list, unsigned long length, unsigned long size,
+                                      bool& cut);
 
 int Load_Document_Index(int documentIndex, int loadKeys);
 void LoadKeywords(const char* definitionPath, int documentIndex);

@@ -3,6 +3,7 @@
 #include <gtest/gtest.h>
 
 #include <cstdint>
+#include <cstdio>
 #include <filesystem>
 #include <string>
 #include <vector>
@@ -219,6 +220,21 @@ TEST_F(DocumentsTest, LabelsBeyondTheTableAreReportedOnce) {
   EXPECT_EQ(DocumentTable[kMaxDocuments - 1].Path, "l/8187");
   EXPECT_EQ(CountContaining(capture, "Too many documents"), 1);
   EXPECT_TRUE(capture.Contains("Docuvane: ERROR: Too many documents when try to add: l/8188"));
+}
+
+TEST_F(DocumentsTest, OverlongDocListIsCutWithAWarning) {
+  tex_.Write("doc/guide.pdf", "%PDF");
+  std::string lines;
+  for (int i = 0; i < 1000; ++i) {
+    char key[48];
+    std::snprintf(key, sizeof key, "K%039d", i);  // 40 bytes and a NUL in the list
+    lines += std::string(key) + "=guide.pdf\n";
+  }
+  WriteIni(lines);
+  MessageCapture capture;
+  Collect_Documents();
+  EXPECT_EQ(DocumentCount, 31998 / 41) << "whole keys only; the cut one finds no value";
+  EXPECT_TRUE(capture.Contains("WARNING: [DOC] key list cut at 32000 bytes in " + IniFilePath));
 }
 
 TEST_F(DocumentsTest, TracesOfTheCollection) {

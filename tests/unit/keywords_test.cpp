@@ -85,6 +85,30 @@ TEST(DecodeKeywordTest, EscapesAndLimits) {
   EXPECT_EQ(tiny[0], '\0');
 }
 
+TEST(SplitKeyListTest, WholeNamesOnly) {
+  struct Row {
+    const char* what;
+    std::string list;  // as the buffer holds it
+    unsigned long length;
+    unsigned long size;
+    std::vector<std::string> names;
+    bool cut;
+  };
+  const Row rows[] = {
+      {"complete list", std::string("ab\0c\0\0", 6), 5, 100, {"ab", "c"}, false},
+      {"empty list", std::string("\0\0", 2), 0, 100, {}, false},
+      {"cut inside the last name", std::string("abc\0de\0\0", 8), 6, 8, {"abc"}, true},
+      {"cut inside the first name", std::string("abcdef\0\0", 8), 6, 8, {}, true},
+  };
+  for (const Row& row : rows) {
+    bool cut = !row.cut;
+    std::vector<std::string> names;
+    for (const char* n : SplitKeyList(row.list.data(), row.length, row.size, cut)) names.push_back(n);
+    EXPECT_EQ(names, row.names) << row.what;
+    EXPECT_EQ(cut, row.cut) << row.what;
+  }
+}
+
 TEST(CompareIgnoringCaseTest, FoldsToLowerThenUnsignedBytes) {
   struct Row {
     const char* a;
@@ -201,6 +225,17 @@ TEST_F(KeywordTest, DefinitionFileLoadsItsKeywords) {
   EXPECT_TRUE(capture.Contains("Docuvane: INFO: Load_Document_Index - guide.pdf"));
   EXPECT_TRUE(capture.Contains("Docuvane: Loads Keys from file: " + ddf));
   EXPECT_TRUE(capture.Contains("WARNING: Keyword longer than 63 bytes skipped: \\LLL"));
+}
+
+TEST_F(KeywordTest, OverlongKeyListIsCutWithAWarning) {
+  TempDir tex;
+  std::string ddf = "[Keywords]\n";
+  for (int i = 0; i < 1000; ++i) ddf += "\\k" + std::string(36, 'x') + std::to_string(1000 + i) + "=a\n";
+  const std::string path = tex.Write("doc/big.ddf", ddf);
+  MessageCapture capture;
+  LoadKeywords(path.c_str(), 0);
+  EXPECT_TRUE(capture.Contains("WARNING: [Keywords] key list cut at 32000 bytes in " + path));
+  EXPECT_EQ(DumpList().size(), 31998u / 43) << "whole keys only, the cut one left out";
 }
 
 TEST_F(KeywordTest, WithoutLoadKeysOnlyTheFileIsNoted) {
