@@ -77,7 +77,7 @@ class TreeCtrlView : public DocumentTreeView {
 }  // namespace
 
 int ProcessCommand(Docuvane* panel, const char* command, int exact) {
-  if (!panel) return 0;
+  if (!panel) return 1;
   PanelCommands commands(panel);
   return ProcessCommand(commands, command, exact);
 }

@@ -119,11 +119,90 @@ TEST_F(LookupTest, TypingSelectsTheWordAndFillsLocations) {
   EXPECT_EQ(p->m_wordList->GetString(p->m_wordList->GetSelection()), "\\section");
   EXPECT_EQ(p->m_targetList->GetCount(), 4u);
 
+  // Clearing the field keeps the word and its locations.
+  p->m_search->SetValue("");
+  Flush();
+  EXPECT_EQ(p->m_wordList->GetString(p->m_wordList->GetSelection()), "\\section");
+  EXPECT_EQ(p->m_targetList->GetCount(), 4u);
+
   // Without the backslash the prefix search ignores it and the brace.
   p->m_search->SetValue("al");
   Flush();
   EXPECT_EQ(p->m_wordList->GetString(p->m_wordList->GetSelection()), "{align}");
   EXPECT_EQ(Locations(), std::vector<std::string>{"math/amsldoc.pdf#page=7 "});
+}
+
+TEST_F(LookupTest, ClickingAWordShowsItsLocations) {
+  Docuvane* p = panel();
+  QListBox* words = p->m_wordList;
+  MessageCapture messages;
+  // Row 1 is \alpha; rows have one height and the list starts at row 0.
+  const int row = 1;
+  ClickAt(words->ClientToScreen(wxPoint(30, row * words->RowHeight + words->RowHeight / 2)));
+  ASSERT_TRUE(WaitFor([&] { return words->GetSelection() == row; }));
+  ASSERT_TRUE(WaitFor([&] { return p->m_targetList->GetCount() == 1; }));
+  EXPECT_EQ(Locations(), std::vector<std::string>{"math/amsldoc.pdf#page=2 "});
+  EXPECT_EQ(messages.LevelOf("INFO: Docuvane::OnIndexChanged to \\alpha"), 3);
+  EXPECT_FALSE(p->m_gotoButton->IsEnabled());
+}
+
+TEST_F(LookupTest, CommandsRunOnThePanel) {
+  Docuvane* p = panel();
+  struct Row {
+    const char* what;
+    const char* command;
+    int exact;
+    const char* word;  // selected afterwards
+    std::vector<std::string> locations;
+  };
+  const std::string guide = Doc("latex/guide/guide.pdf");
+  const Row rows[] = {
+      {"a word is searched and shown", "\\alpha", 0, "\\alpha", {"math/amsldoc.pdf#page=2 "}},
+      {"a prefix selects the first word", "\\sectionm", 0, "\\sectionmark",
+       {"latex/base/sample.pdf#page=20 "}},
+      {"an unlisted keyword keeps the word and lists its target", "\\chapter", 1, "\\sectionmark",
+       {guide + "#chap"}},
+  };
+  for (const Row& row : rows) {
+    SCOPED_TRACE(row.what);
+    ProcessCommand(p, row.command, row.exact);
+    Flush();
+    EXPECT_EQ(p->m_wordList->GetString(p->m_wordList->GetSelection()), row.word);
+    EXPECT_EQ(Locations(), row.locations);
+  }
+  // Its single target opened at once, as a command asks.
+  EXPECT_EQ(WaitForRun("docuvane-test-viewer"), (std::vector<std::string>{guide, "chap"}));
+  ProcessCommand(static_cast<Docuvane*>(nullptr), "\\alpha", 0);  // no panel: nothing to do
+}
+
+TEST_F(LookupTest, HighlightFollowsTheDocumentPartAndSurvivesARebuild) {
+  Docuvane* p = panel();
+  const wxTreeItemId sample = FindItem(p->m_tree->GetRootItem(), "sample.pdf");
+  struct Row {
+    const char* what;
+    std::string text;
+    bool bold;
+  };
+  const Row rows[] = {
+      {"a text without '#' is matched whole", "latex/base/sample.pdf", true},
+      {"case is ignored", "LATEX/Base/Sample.PDF#page=1 ", true},
+      {"a document the table does not know leaves the tree alone", "other.pdf#page=1", false},
+  };
+  for (const Row& row : rows) {
+    SCOPED_TRACE(row.what);
+    Show_Topic(p, "tabular", 0);  // clears the bold
+    HighlightDocument(p, row.text.c_str());
+    EXPECT_EQ(p->m_tree->IsBold(sample), row.bold);
+    EXPECT_EQ(HighlightedItem.IsOk(), row.bold);
+  }
+  // Rebuilding the tree deletes the bold item; the next lookup must not
+  // touch it.
+  HighlightDocument(p, "latex/base/sample.pdf");
+  ASSERT_TRUE(HighlightedItem.IsOk());
+  Fill_Tree(p);
+  EXPECT_FALSE(HighlightedItem.IsOk());
+  Show_Topic(p, "\\section", 0);
+  EXPECT_EQ(p->m_targetList->GetCount(), 4u);
 }
 
 TEST_F(LookupTest, SelectingLocationsBoldsTheirDocumentAndEnablesGoTo) {
@@ -181,6 +260,8 @@ TEST_F(LookupTest, GoToAndDoubleClickOpenTheLocationThroughTheTemplate) {
   EXPECT_FALSE(frameSawGoTo) << "the panel handles \"&Go To\"";
 
   // A double-click on a keyword location opens the document at its anchor.
+  ClickLocation(1);
+  ASSERT_TRUE(WaitFor([&] { return p->m_targetList->GetSelection() == 1; }));
   ClickLocation(1, true);
   EXPECT_EQ(WaitForRun("docuvane-test-viewer"),
             (std::vector<std::string>{Doc("latex/guide/guide.pdf"), "sec:section"}));
@@ -210,6 +291,22 @@ TEST_F(LookupTest, DoubleClickInTheTreeOpensTheDocument) {
   ClickAt(p->m_tree->ClientToScreen(rect.GetPosition() + wxPoint(rect.width / 2, rect.height / 2)), true);
   ASSERT_TRUE(WaitFor([&] { return messages.Contains("Not found clicked document"); }));
   EXPECT_TRUE(tree.Records("docuvane-test-viewer").empty());
+}
+
+TEST_F(LookupTest, OpenCommandOpensTheSelectedTreeDocument) {
+  Docuvane* p = panel();
+  MessageCapture messages;
+  auto send = [&] {
+    wxCommandEvent open(wxEVT_BUTTON, ID_OPEN_DOC);
+    p->GetEventHandler()->ProcessEvent(open);
+  };
+  p->m_tree->SelectItem(FindItem(p->m_tree->GetRootItem(), "Catalogue"));
+  send();
+  const auto args = WaitForRun("docuvane-test-viewer");
+  ASSERT_FALSE(args.empty());
+  EXPECT_EQ(args[0], Doc("fonts/fontcat.pdf"));
+  EXPECT_EQ(p->Open_Document(wxTreeItemId()), 0);
+  EXPECT_EQ(messages.LevelOf("ERROR: Docuvane::Open_Document invalid wxTreeItemId"), 5);
 }
 
 TEST_F(LookupTest, HelpAndInternetButtonsReachTheFrame) {

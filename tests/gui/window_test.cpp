@@ -91,6 +91,8 @@ TEST_F(WindowTest, ShowsCatalogueTreeWordListAndCounts) {
   EXPECT_EQ(frame->GetStatusBar()->GetStatusText(0),
             "There are 7 documents including 4 TeX commands and 1 LaTeX environments.");
   EXPECT_EQ(frame->GetTitle(), "Lomari Docuvane");
+  EXPECT_EQ(frame->GetIcons().GetIconCount(), 5u) << "the compiled-in icon, 16 to 256 pixels";
+  EXPECT_EQ(frame->GetFont().GetPointSize(), 10);
 
   // Nothing chosen yet: no locations, nothing to go to.
   EXPECT_FALSE(p->m_gotoButton->IsEnabled());
@@ -105,6 +107,23 @@ TEST_F(WindowTest, ShowsCatalogueTreeWordListAndCounts) {
   EXPECT_TRUE(p->IsSplit());
   EXPECT_EQ(p->GetWindow1(), p->m_tree);
   EXPECT_EQ(p->GetMinimumPaneSize(), 20);
+}
+
+TEST_F(WindowTest, WordListCanBeCreatedByClassName) {
+  tree.BuildAll();
+  Docuvane_Init();
+  auto* list = wxDynamicCast(wxCreateDynamicObject("QListBox"), QListBox);
+  ASSERT_NE(list, nullptr);
+  EXPECT_EQ(list->WordCount, 0) << "nothing is read before Create";
+  EXPECT_GT(list->RowHeight, 0);
+  EXPECT_EQ(list->GetMargins(), wxPoint(8, 0));
+  wxFrame* parent = new wxFrame(nullptr, wxID_ANY, "parent");
+  ASSERT_TRUE(list->Create(parent, ID_WORD_LIST));
+  EXPECT_EQ(list->WordCount, 6);
+  EXPECT_EQ(list->GetItemCount(), 6u);
+  EXPECT_EQ(FindWordInList(list, "sec", 0), 3);
+  EXPECT_EQ(FindWordInList(nullptr, "sec", 0), -1);
+  delete parent;
 }
 
 TEST_F(WindowTest, WithoutWordIndexTheListIsEmptyAndCountsAreZero) {
