@@ -440,6 +440,48 @@ TEST_F(OpenDocTest, DefaultRouteAndFailures) {
   EXPECT_TRUE(capture.Contains("WARNING: execution failed with error code=-1"));
 }
 
+TEST_F(OpenDocTest, OverlongTextsAreRefusedNotCut) {
+  const std::string longServer = "http://docs.test/" + std::string(500, 's');
+  const std::string name255 = "/d/" + std::string(248, 'n') + ".xyz";  // exactly 255
+  const std::string name256 = "/d/" + std::string(249, 'n') + ".xyz";
+  const std::string deepRelative = std::string(250 - CacheDir().size(), 'r') + "/x.pdf";  // cache path 256
+  const std::string longReader = "/opt/" + std::string(300, 'a') + "/acroread";
+  struct Row {
+    const char* what;
+    std::string name;
+    const char* anchor;
+    std::string server;
+    std::string reader;
+    const char* error;   // "" when nothing is refused
+    bool opened;         // reached the default application
+  } rows[] = {
+      {"name of 255 characters", name255, nullptr, kServer, "", "", true},
+      {"name of 256 characters", name256, nullptr, kServer, "", "ERROR: document name too long: ", false},
+      {"cache path beyond the name's capacity", deepRelative, nullptr, kServer, "",
+       "ERROR: document path too long: ", false},
+      {"server URL beyond 511", "a/b.pdf", nullptr, longServer, "", "ERROR: document server URL too long: ", false},
+      {"reader path beyond 259 is no reader", "/d/g.pdf", "page=1", kServer, longReader,
+       "ERROR: PDF reader path too long: ", true},
+  };
+  for (const Row& row : rows) {
+    SCOPED_TRACE(row.what);
+    DocumentServerURL = row.server.c_str();
+    FakeAccessServices services;
+    services.reader = row.reader;
+    MessageCapture capture;
+    EXPECT_EQ(OpenDocumentFile(services, row.name.c_str(), row.anchor), 0);
+    EXPECT_TRUE(services.executed.empty());
+    EXPECT_TRUE(services.downloads.empty());
+    EXPECT_EQ(services.defaultApplication.size(), row.opened ? 1u : 0u);
+    if (*row.error) {
+      EXPECT_TRUE(capture.Contains(row.error));
+    } else {
+      EXPECT_FALSE(capture.Contains("ERROR"));
+    }
+  }
+  DocumentServerURL = kServer;
+}
+
 // Names and anchors that a shell or a re-split command line would misread.
 std::vector<std::string> HostileTexts(const std::string& sentinel) {
   return {
