@@ -66,6 +66,9 @@ Docuvane::Docuvane(wxWindow* parent, const wxPoint& pos, const wxSize& size) {
                               wxCLIP_CHILDREN,
                           wxDefaultValidator, "treeCtrl");
   m_tree->SetBackgroundColour(menuColour);
+  // The initial size would also become the tree's minimum width; the sash
+  // is bounded by the splitter's minimum pane size alone.
+  m_tree->SetMinSize(wxDefaultSize);
 
   wxPanel* pane = new wxPanel(m_splitter, wxID_ANY, wxDefaultPosition, wxDefaultSize,
                               wxBORDER_STATIC | wxTAB_TRAVERSAL);

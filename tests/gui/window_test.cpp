@@ -292,11 +292,11 @@ TEST_F(WindowTest, SashPositionIsRestoredTracedAndSavedInDips) {
   messages.clear();
   drag(2);
   ASSERT_TRUE(WaitFor([&] { return !sashTraces().empty(); }));
-  EXPECT_GE(p->GetSashPosition(), 20);
+  EXPECT_EQ(p->GetSashPosition(), 20);
   messages.clear();
   drag(p->GetClientSize().x - 2);
   ASSERT_TRUE(WaitFor([&] { return !sashTraces().empty(); }));
-  EXPECT_GE(p->GetClientSize().x - p->GetSashPosition() - p->GetSashSize(), 20);
+  EXPECT_EQ(p->GetClientSize().x - p->GetSashPosition() - p->GetSashSize(), 20);
 
   const int finalPosition = p->GetSashPosition();
   const int finalDip = p->ToDIP(finalPosition);
