@@ -84,7 +84,10 @@ MyFrame::MyFrame(const wxString& title)
   SetStatusText("There are # documents including # TeX commands and # LaTeX environments.", 0);
 
   TraceMessage("Docuvane::Frame --- ", "Creating Helper ...");
-  m_helpPanel = new Docuvane(this, wxDefaultPosition, wxDefaultSize);
+  // Created at the size the frame gives its only child anyway: split at its
+  // sash position inside a default-sized window, GTK would be asked to lay
+  // out the panes at negative sizes.
+  m_helpPanel = new Docuvane(this, wxDefaultPosition, GetClientSize());
   TraceMessage("Docuvane::Frame --- ", "Collect_Documents ...");
   Collect_Documents();
   TraceMessage("Docuvane::Frame --- ", "Fill_Tree ...");
