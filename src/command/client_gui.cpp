@@ -29,11 +29,12 @@ using std::chrono::milliseconds;
 const char* const kHost = "localhost";
 
 // A start that meets an instance still building its window finds no socket
-// yet; a start that meets a full listen queue is refused for a moment.
-// Both try again after a short pause, within these bounds.
+// yet; a start that meets a full listen queue (many starts at once on a busy
+// machine) is refused for a while.  Both try again after a short pause,
+// within this bound.  (A socket left by a dead instance is no reason to
+// stop early: the lock is free then, and the start becomes the instance.)
 constexpr milliseconds kRetryPause(100);
-constexpr milliseconds kWaitForStartingServer(8000);
-constexpr int kAttemptsOnRefusal = 20;
+constexpr milliseconds kConnectBudget(8000);
 // Longest wait for any one answer of the server (it answers at once unless
 // it is stuck).
 constexpr milliseconds kAnswerLimit(2000);
@@ -129,8 +130,7 @@ bool SocketFileExists(const std::string& path) {
 CmdConnection* Connect(MyClient& client, const std::string& path, AnswerWatchdog& watchdog) {
   if (path.empty() || path.find('/') == std::string::npos || path.size() > kMaxSocketPath)
     return nullptr;
-  const auto giveUp = Clock::now() + kWaitForStartingServer;
-  int refusals = 0;
+  const auto giveUp = Clock::now() + kConnectBudget;
   for (;;) {
     const bool socketThere = SocketFileExists(path);
     if (socketThere) {
@@ -144,7 +144,6 @@ CmdConnection* Connect(MyClient& client, const std::string& path, AnswerWatchdog
         Message("ERROR: DDE client ", "no answer from the server", 5);
         return nullptr;
       }
-      if (++refusals >= kAttemptsOnRefusal) return nullptr;
     }
     if (Clock::now() + kRetryPause > giveUp) return nullptr;
     std::this_thread::sleep_for(kRetryPause);

@@ -87,6 +87,49 @@ inline std::string Describe(const std::vector<LogLine>& log) {
   return out.str();
 }
 
+// Gives this test process an X display of its own when it has none (the
+// test runner may start it without the display wrapper): an Xvfb server that
+// picks its own number and ends with the process.
+inline void EnsureDisplay() {
+  static bool done = false;
+  if (done) return;
+  done = true;
+  const char* display = std::getenv("DISPLAY");
+  if (display != nullptr && *display != '\0') return;
+  int pipeFds[2];
+  if (pipe(pipeFds) != 0) return;
+  const std::string fdText = std::to_string(pipeFds[1]);
+  std::vector<std::string> args = {"Xvfb", "-displayfd", fdText, "-screen", "0", "1600x1200x24",
+                                   "-nolisten", "tcp", "-noreset"};
+  std::vector<char*> argv;
+  for (auto& a : args) argv.push_back(a.data());
+  argv.push_back(nullptr);
+  posix_spawn_file_actions_t actions;
+  posix_spawn_file_actions_init(&actions);
+  posix_spawn_file_actions_addclose(&actions, pipeFds[0]);
+  posix_spawn_file_actions_addopen(&actions, 1, "/dev/null", O_WRONLY, 0);
+  posix_spawn_file_actions_addopen(&actions, 2, "/dev/null", O_WRONLY, 0);
+  static pid_t server = -1;
+  const int spawned = posix_spawnp(&server, "Xvfb", &actions, nullptr, argv.data(), environ);
+  posix_spawn_file_actions_destroy(&actions);
+  close(pipeFds[1]);
+  std::string number;
+  if (spawned == 0) {
+    pollfd p{pipeFds[0], POLLIN, 0};
+    char c;
+    while (poll(&p, 1, 10000) > 0 && read(pipeFds[0], &c, 1) == 1 && c != '\n') number.push_back(c);
+  }
+  close(pipeFds[0]);
+  if (number.empty()) return;
+  setenv("DISPLAY", (":" + number).c_str(), 1);
+  std::atexit([] {
+    if (server > 0) {
+      kill(server, SIGTERM);
+      waitpid(server, nullptr, 0);
+    }
+  });
+}
+
 // A started program.
 struct Process {
   pid_t pid = -1;
@@ -125,6 +168,7 @@ struct Process {
 class Sandbox {
  public:
   Sandbox() {
+    EnsureDisplay();
     home_ = dir_ / "home";
     runtime_ = dir_ / "run";
     cache_ = dir_ / "cache";
