@@ -99,11 +99,6 @@ TEST_F(WindowTest, ShowsCatalogueTreeWordListAndCounts) {
   EXPECT_EQ(p->m_gotoButton->GetLabel(), "&Go To");
   EXPECT_EQ(p->m_targetList->GetCount(), 0u);
   EXPECT_EQ(p->m_search->GetValue(), "");
-  EXPECT_EQ(p->GetId(), ID_SPLITTER);
-  EXPECT_EQ(p->m_tree->GetId(), ID_TREE);
-  EXPECT_EQ(p->m_wordList->GetId(), ID_WORD_LIST);
-  EXPECT_EQ(p->m_targetList->GetId(), ID_TARGET_LIST);
-  EXPECT_EQ(p->m_search->GetId(), ID_SEARCH);
   EXPECT_TRUE(p->IsSplit());
   EXPECT_EQ(p->GetWindow1(), p->m_tree);
   EXPECT_EQ(p->GetMinimumPaneSize(), 20);
@@ -181,21 +176,12 @@ TEST_F(WindowTest, GeometryIsRestoredAndClampedToTheScreen) {
   }
 }
 
-TEST_F(WindowTest, FrameCannotShrinkBelowMinimumAndMovesAreSaved) {
+TEST_F(WindowTest, FrameCannotShrinkBelowMinimum) {
   OpenFrame();
   EXPECT_EQ(frame->GetMinSize(), frame->FromDIP(wxSize(512, 512)));
   frame->SetSize(300, 200);
   Flush();
-  EXPECT_GE(frame->GetSize().x, frame->FromDIP(512));
-  EXPECT_GE(frame->GetSize().y, frame->FromDIP(512));
-  frame->SetSize(120, 80, 700, 560);
-  Flush();
-  CloseFrame();
-  wxConfigBase* config = wxConfigBase::Get();
-  EXPECT_EQ(config->ReadLong("/MainWindow/x", -1), 120);
-  EXPECT_EQ(config->ReadLong("/MainWindow/y", -1), 80);
-  EXPECT_EQ(config->ReadLong("/MainWindow/w", -1), 700);
-  EXPECT_EQ(config->ReadLong("/MainWindow/h", -1), 560);
+  EXPECT_EQ(frame->GetSize(), frame->FromDIP(wxSize(512, 512)));
 }
 
 // Minimized and maximized states need a window manager, which the test
