@@ -244,6 +244,15 @@ TEST_F(DownloadTest, FileSchemeIsCopiedWithoutResponseCheck) {
   EXPECT_TRUE(capture.Contains("ERROR: wxGet can't initialize stream for file://"));
 }
 
+TEST_F(DownloadTest, ProgressMessageIsCutTo255Characters) {
+  const std::string name = std::string(300, 'n') + ".pdf";
+  server_.Route("/" + name, Ok("doc"));
+  Recorder progress;
+  EXPECT_EQ(Fetch(progress, server_.Url("/" + name)), 3);
+  ASSERT_FALSE(progress.calls.empty());
+  EXPECT_EQ(progress.calls[0].message, ("Downloading " + name).substr(0, 255));
+}
+
 TEST_F(DownloadTest, UncreatableFileEndsWithoutFinalMessage) {
   server_.Route("/a.pdf", Ok("data"));
   MessageCapture capture;
