@@ -6,6 +6,7 @@
 #include <gtest/gtest.h>
 
 #include "e2e_support.h"
+#include "platform/instance_lock.h"
 
 namespace {
 
@@ -279,6 +280,49 @@ TEST(CommandChannel, RecoveryAfterTheInstanceIsKilled) {
     EXPECT_EQ(later.status, 255) << row.what;
     EXPECT_TRUE(WaitFor([&] { return Executed(next.Log())["served"] == 1; })) << row.what << Describe(next.Log());
     next.Stop();
+  }
+}
+
+TEST(CommandChannel, LaterStartNeverHangsOnAStuckInstance) {
+  struct Row {
+    const char* what;
+    bool listening;  // a socket that takes connections but never answers
+    const char* error;
+  };
+  const Row rows[] = {
+      {"an instance that holds the lock and never answers", true,
+       "ERROR: DDE client no answer from the server"},
+      {"an instance that holds the lock but has no socket", false, nullptr},
+  };
+  for (const Row& row : rows) {
+    Sandbox box;
+    // Stand in for a running instance: hold its lock (and its socket).
+    std::filesystem::create_directories(box.runtimeDir());
+    chmod(box.runtimeDir().c_str(), 0700);
+    InstanceLock lock;
+    const std::string lockFile = std::filesystem::path(box.lockPath()).filename().string();
+    ASSERT_TRUE(lock.Create(lockFile.substr(0, lockFile.size() - 5), box.runtimeDir())) << row.what;
+    int listener = -1;
+    if (row.listening) {
+      listener = socket(AF_UNIX, SOCK_STREAM, 0);
+      sockaddr_un address{};
+      address.sun_family = AF_UNIX;
+      std::strncpy(address.sun_path, box.socketPath().c_str(), sizeof address.sun_path - 1);
+      ASSERT_EQ(bind(listener, reinterpret_cast<sockaddr*>(&address), sizeof address), 0);
+      ASSERT_EQ(listen(listener, 5), 0);
+    }
+    const auto start = Clock::now();
+    Process later = box.Run({"lost"}, std::chrono::milliseconds(30000));
+    const auto took = Clock::now() - start;
+    EXPECT_EQ(later.status, 255) << row.what;
+    EXPECT_LT(took, std::chrono::milliseconds(15000)) << row.what;
+    const auto own = later.Log();
+    EXPECT_TRUE(HasLineStarting(own, "INFO: Connection Client host=\"localhost\"")) << Describe(own);
+    EXPECT_EQ(own.back().text.find("failed to connect") != std::string::npos, true) << Describe(own);
+    if (row.error) {
+      EXPECT_EQ(CountLines(own, row.error), 1) << Describe(own);
+    }
+    if (listener >= 0) close(listener);
   }
 }
 
