@@ -15,6 +15,9 @@ if [ -z "${display_number:-}" ]; then
   exit 1
 fi
 DISPLAY=":$display_number"
+# Tells test programs that they already run on a display of their own.
+DOCUVANE_PRIVATE_DISPLAY=1
+export DOCUVANE_PRIVATE_DISPLAY
 export DISPLAY
 unset WAYLAND_DISPLAY
 "$@"
