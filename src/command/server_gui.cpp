@@ -301,7 +301,7 @@ wxConnectionBase* MyServer::OnAcceptConnection(const wxString& topic) {
   m_acceptedConnection = connection;
   Message("INFO: DDE server ", "Connection accepted");
   // An earlier conversation that has already ended is not needed any more.
-  if (previous != nullptr && !previous->GetConnected()) Forget(previous);
+  if (previous != nullptr && previous->Ended()) Forget(previous);
   return connection;
 }
 
@@ -389,6 +389,7 @@ bool MyConnection::DoAdvise(const wxString& item, const void* data, size_t size,
 
 bool MyConnection::OnDisconnect() {
   Message("INFO: DDE server ", "OnDisconnect()");
+  ended_ = true;
   // May delete this object: nothing may touch it afterwards.
   server_->Disconnected(this);
   return true;

@@ -30,14 +30,15 @@ class MyConnection : public wxConnection {
   // The reply of the last request; it must outlive OnRequest.
   wxCharBuffer m_replyBuffer;
 
-  // The socket under the conversation (set by the framework after accept).
-  wxSocketBase* Socket() const { return m_sock; }
+  // True once the client has ended the conversation (or vanished).
+  bool Ended() const { return ended_; }
 
  protected:
   bool DoAdvise(const wxString& item, const void* data, size_t size, wxIPCFormat format) override;
 
  private:
   MyServer* server_;
+  bool ended_ = false;
 };
 
 class MyServer : public wxServer {
