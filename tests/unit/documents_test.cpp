@@ -2,6 +2,7 @@
 
 #include <gtest/gtest.h>
 
+#include <algorithm>
 #include <cstdint>
 #include <cstdio>
 #include <filesystem>
@@ -41,13 +42,6 @@ std::string IndexBytes(const std::vector<std::string>& labels) {
   return bytes;
 }
 
-int CountContaining(const MessageCapture& capture, const std::string& needle) {
-  int n = 0;
-  for (const auto& m : capture.messages())
-    if (m.line().find(needle) != std::string::npos) ++n;
-  return n;
-}
-
 class DocumentsTest : public ::testing::Test {
  protected:
   void SetUp() override {
@@ -55,20 +49,19 @@ class DocumentsTest : public ::testing::Test {
     saved_trace_mode_ = TraceMode;
     TraceMode = 0;
     ProfileCacheClear();
-    KeywordListReset();
-    PoolReset();
-    for (int i = 0; i < DocumentCount; ++i) DocumentTable[i] = DocumentEntry{};
-    DocumentCount = 0;
-    CloseWordIndex();
+    Empty();
   }
   void TearDown() override {
+    Empty();
+    IniFilePath = saved_ini_;
+    TraceMode = saved_trace_mode_;
+  }
+  static void Empty() {
     CloseWordIndex();
     for (int i = 0; i < DocumentCount; ++i) DocumentTable[i] = DocumentEntry{};
     DocumentCount = 0;
     KeywordListReset();
     PoolReset();
-    IniFilePath = saved_ini_;
-    TraceMode = saved_trace_mode_;
   }
 
   // Writes Docuvane.ini with the given [DOC] lines and points the settings at it.
@@ -218,7 +211,9 @@ TEST_F(DocumentsTest, LabelsBeyondTheTableAreReportedOnce) {
 
   EXPECT_EQ(DocumentCount, kMaxDocuments);
   EXPECT_EQ(DocumentTable[kMaxDocuments - 1].Path, "l/8187");
-  EXPECT_EQ(CountContaining(capture, "Too many documents"), 1);
+  EXPECT_EQ(std::count_if(capture.messages().begin(), capture.messages().end(),
+                          [](const auto& m) { return m.text.find("Too many") != std::string::npos; }),
+            1);
   EXPECT_TRUE(capture.Contains("Docuvane: ERROR: Too many documents when try to add: l/8188"));
 }
 

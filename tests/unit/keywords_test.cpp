@@ -85,30 +85,6 @@ TEST(DecodeKeywordTest, EscapesAndLimits) {
   EXPECT_EQ(tiny[0], '\0');
 }
 
-TEST(SplitKeyListTest, WholeNamesOnly) {
-  struct Row {
-    const char* what;
-    std::string list;  // as the buffer holds it
-    unsigned long length;
-    unsigned long size;
-    std::vector<std::string> names;
-    bool cut;
-  };
-  const Row rows[] = {
-      {"complete list", std::string("ab\0c\0\0", 6), 5, 100, {"ab", "c"}, false},
-      {"empty list", std::string("\0\0", 2), 0, 100, {}, false},
-      {"cut inside the last name", std::string("abc\0de\0\0", 8), 6, 8, {"abc"}, true},
-      {"cut inside the first name", std::string("abcdef\0\0", 8), 6, 8, {}, true},
-  };
-  for (const Row& row : rows) {
-    bool cut = !row.cut;
-    std::vector<std::string> names;
-    for (const char* n : SplitKeyList(row.list.data(), row.length, row.size, cut)) names.push_back(n);
-    EXPECT_EQ(names, row.names) << row.what;
-    EXPECT_EQ(cut, row.cut) << row.what;
-  }
-}
-
 TEST(CompareIgnoringCaseTest, FoldsToLowerThenUnsignedBytes) {
   struct Row {
     const char* a;
@@ -236,19 +212,6 @@ TEST_F(KeywordTest, OverlongKeyListIsCutWithAWarning) {
   LoadKeywords(path.c_str(), 0);
   EXPECT_TRUE(capture.Contains("WARNING: [Keywords] key list cut at 32000 bytes in " + path));
   EXPECT_EQ(DumpList().size(), 31998u / 43) << "whole keys only, the cut one left out";
-}
-
-TEST_F(KeywordTest, WithoutLoadKeysOnlyTheFileIsNoted) {
-  TempDir tex;
-  const std::string ddf = tex.Write("doc/a.b.ddf", "[Keywords]\n\\x=1\n");
-  ScopedEnv texmf("TEXMF", tex.path());
-  DocumentCount = 1;
-  DocumentTable[0].FileName = "a.b.c";
-  MessageCapture capture;
-  EXPECT_EQ(Load_Document_Index(0, 0), 1);
-  EXPECT_EQ(DocumentTable[0].DefinitionFile, ddf);
-  EXPECT_TRUE(DumpList().empty());
-  EXPECT_TRUE(capture.messages().empty()) << "no extra traces without TraceMode";
 }
 
 }  // namespace
