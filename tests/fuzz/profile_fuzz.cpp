@@ -1,7 +1,4 @@
 // libFuzzer driver for the INI text parser.
-#include <cstddef>
-#include <cstdint>
-
 #include "profile_target.h"
 
 extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {

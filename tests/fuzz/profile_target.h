@@ -1,6 +1,7 @@
-// Fuzz target for the INI text parser: every way the program reads a value
-// or a key list, with buffers from empty to roomy.  Shared by the libFuzzer
-// driver and the corpus replay in the unit tests.
+// Fuzz target for the INI text parser, shared by the libFuzzer driver and the
+// corpus replay.  The first and last bytes (read as part of the text as well)
+// choose the section, the key and the buffer size; each run then asks for a
+// value, the section's key names and the section names.
 #pragma once
 
 #include <cstddef>
@@ -10,44 +11,36 @@
 
 #include "platform/profile.h"
 
-inline int FuzzProfileInput(const uint8_t* data, size_t size) {
-  const char* text = reinterpret_cast<const char*>(data);
-  // Names the seeds use (in other cases), an empty one, and NULL for the
-  // name lists; sizes around the edges of every cut.
-  static const char* const kSections[] = {"setup", "DOC", "", nullptr};
-  static const char* const kKeys[] = {"TRACE", "root", "a", nullptr};
-  static const unsigned long kSizes[] = {0, 1, 2, 3, 9, 300};
-
-  for (const char* section : kSections) {
-    for (const char* key : kKeys) {
-      for (unsigned long buffer_size : kSizes) {
-        // One guard byte past the end catches any write beyond the size given.
-        std::vector<char> buffer(buffer_size + 1, '\x5a');
-        unsigned long n = ProfileStringFromText(text, size, section, key, "dflt", buffer.data(),
-                                                buffer_size);
-        if (buffer[buffer_size] != '\x5a') __builtin_trap();
-        if (buffer_size == 0) {
-          if (n != 0) __builtin_trap();
-          continue;
-        }
-        if (n >= buffer_size) __builtin_trap();
-        if (key != nullptr && section != nullptr) {
-          // A value: NUL-terminated at the count returned.
-          if (buffer[n] != '\0' || std::strlen(buffer.data()) != n) __builtin_trap();
-        } else {
-          // A list: names read one after another must reach the empty one
-          // inside the buffer, as every caller walks it.
-          if (buffer[n] != '\0') __builtin_trap();
-          size_t at = 0;
-          while (at < buffer_size && buffer[at] != '\0') {
-            const void* end = std::memchr(buffer.data() + at, '\0', buffer_size - at);
-            if (end == nullptr) __builtin_trap();
-            at = static_cast<size_t>(static_cast<const char*>(end) - buffer.data()) + 1;
-          }
-          if (at >= buffer_size) __builtin_trap();
-        }
-      }
-    }
+inline void FuzzProfileLookup(const char* text, size_t length, const char* section, const char* key,
+                              unsigned long size) {
+  std::vector<char> buffer(size + 1, '\x5a');  // a guard byte past the size given
+  unsigned long n = ProfileStringFromText(text, length, section, key, "dflt", buffer.data(), size);
+  if (buffer[size] != '\x5a' || (size == 0 && n != 0)) __builtin_trap();
+  if (size == 0) return;
+  if (n >= size || buffer[n] != '\0') __builtin_trap();
+  if (key != nullptr && section != nullptr) {
+    if (std::strlen(buffer.data()) != n) __builtin_trap();
+    return;
   }
+  // A list: walking its names must reach the empty one inside the buffer.
+  size_t at = 0;
+  while (at < size && buffer[at] != '\0') {
+    const void* end = std::memchr(buffer.data() + at, '\0', size - at);
+    if (end == nullptr) __builtin_trap();
+    at = static_cast<size_t>(static_cast<const char*>(end) - buffer.data()) + 1;
+  }
+  if (at >= size) __builtin_trap();
+}
+
+inline int FuzzProfileInput(const uint8_t* data, size_t size) {
+  if (size == 0) return 0;
+  static const char* const kSections[] = {"setup", "DOC", "", "a"};
+  static const char* const kKeys[] = {"TRACE", "root", "a", ""};
+  const char* text = reinterpret_cast<const char*>(data);
+  const char* section = kSections[data[0] & 3];
+  unsigned long buffer_size = (data[size - 1] & 0x20) ? 300 : data[size - 1] & 0x1f;
+  FuzzProfileLookup(text, size, section, kKeys[(data[0] >> 2) & 3], buffer_size);
+  FuzzProfileLookup(text, size, section, nullptr, buffer_size);
+  FuzzProfileLookup(text, size, nullptr, nullptr, buffer_size);
   return 0;
 }

@@ -1,165 +1,136 @@
-// Docuvane_Init: finding the private INI file, its Setup values, and the
-// hand-over to the word index.
+// Tracing, and Docuvane_Init: the private INI file, its Setup values, the word index.
+#include "shell/settings.h"
+
 #include <gtest/gtest.h>
 
 #include <climits>
 #include <filesystem>
-#include <optional>
+#include <list>
 #include <string>
 
 #include "platform/profile.h"
-#include "shell/settings.h"
+#include "shell/trace.h"
 #include "test_support.h"
 #include "wordindex/locate.h"
 #include "wordindex/wordindex.h"
 
 using testing_support::MessageCapture;
-using testing_support::ScopedEnv;
 using testing_support::TempDir;
 
 namespace {
 
-// A TeX tree of its own, an empty system directory for bare INI names, and
+// A TeX tree of its own, a private system directory for bare INI names, and
 // the process-wide values back at their start-up state.
 class SettingsTest : public ::testing::Test {
  protected:
   void SetUp() override {
-    dir_.Write("etc/.keep", "");
     ProfileSetSystemDirectory((dir_ / "etc").c_str());
-    texmf_.emplace("TEXMF", dir_ / "tex");
-    texdir_.emplace("TEXDIR", std::nullopt);
-    quiet_.emplace("TROVLIB_STDERR_LEVEL", "1000");
-    IniFilePath.clear();
-    TraceMode = 0;
-    RootPath.clear();
-    CloseWordIndex();
-    WordIndexPath.clear();
+    env_.emplace_back("TEXMF", dir_ / "tex\\");
+    env_.emplace_back("TEXDIR", std::nullopt);
+    env_.emplace_back("TROVLIB_STDERR_LEVEL", "1000");
   }
-  void TearDown() override {
-    CloseWordIndex();
-    WordIndexPath.clear();
-    ProfileSetSystemDirectory(nullptr);
-  }
-
-  void WriteIni(const std::string& setup) {
-    dir_.Write("tex/Docuvane/Docuvane.ini", "[Setup]\n" + setup + "\n");
+  void TearDown() override { ProfileSetSystemDirectory(nullptr); }
+  int Init(const std::string& ini_file, const std::string& setup) {
+    dir_.Write(ini_file, "[Setup]\n" + setup + "\n");
     TrovResetCaches();
     ProfileCacheClear();
+    CloseWordIndex();
+    WordIndexPath.clear(), IniFilePath.clear(), RootPath.clear();
+    TraceMode = 12345;
+    return Docuvane_Init();
   }
-
   TempDir dir_;
-  std::optional<ScopedEnv> texmf_, texdir_, quiet_;
+  std::list<testing_support::ScopedEnv> env_;
 };
 
-TEST_F(SettingsTest, TraceValueReadLikeAtoi) {
+TEST_F(SettingsTest, SetupValuesFromTheTreeOrTheSystemDirectory) {
+  const std::string in_tree = "tex/Docuvane/Docuvane.ini";
   struct Row {
-    const char* line;
-    int expected;
+    std::string file, setup;
+    int trace;
+    const char* root;
   } rows[] = {
-      {"Trace=2", 2},          {"Trace=abc", 0},     {"Trace=-1", -1},
-      {"Trace=  7x", 7},       {"Trace=+3", 3},      {"Trace=", 0},
-      {"Other=1", 0},          {"TRACE=4", 4},       {"Trace=99999999999", INT_MAX},
-      {"Trace=-99999999999", INT_MIN},
+      {in_tree, "Trace=2\nRoot=D:\\TeX\\%s", 2, "D:\\TeX\\"},
+      {in_tree, "Trace=abc\nRoot=%d%n%x%5s%", 0, "%d%n%x%5s%"},
+      {in_tree, "TRACE=  7x", 7, ""},
+      {in_tree, "Trace=99999999999", INT_MAX, ""},
+      {in_tree, "Trace=-99999999999", INT_MIN, ""},
+      {in_tree, "Other=1", 0, ""},
+      {"etc/Docuvane.ini", "Trace=6\nRoot=/sys", 6, "/sys"},
   };
   for (const auto& row : rows) {
-    WriteIni(row.line);
-    TraceMode = 12345;
-    EXPECT_EQ(Docuvane_Init(), 1) << row.line;
-    EXPECT_EQ(TraceMode, row.expected) << row.line;
+    EXPECT_EQ(Init(row.file, row.setup), 1) << row.setup;
+    EXPECT_EQ(IniFilePath, row.file == in_tree ? dir_ / in_tree : "Docuvane.INI") << row.setup;
+    EXPECT_EQ(TraceMode, row.trace) << row.setup;
+    EXPECT_EQ(RootPath, row.root) << row.setup;
+    std::filesystem::remove(dir_ / row.file);
   }
 }
 
-TEST_F(SettingsTest, RootValueFormattedWithoutPrintf) {
-  struct Row {
-    const char* line;
-    const char* expected;
-  } rows[] = {
-      {"Root=D:\\TeX\\%s", "D:\\TeX\\"},
-      {"Root=100%%", "100%"},
-      {"Root=%d%n%x%5s%", "%d%n%x%5s%"},
-  };
-  for (const auto& row : rows) {
-    WriteIni(row.line);
-    RootPath.clear();
-    Docuvane_Init();
-    EXPECT_EQ(RootPath, row.expected) << row.line;
-  }
+TEST(FormatRootValue, OnlyPercentSTakesTheArgumentAndTheResultIsCutTo255) {
+  EXPECT_EQ(FormatRootValue("<%s> %% %d %n %-5s 50%", "x"), "<x> % %d %n %-5s 50%");
+  EXPECT_EQ(FormatRootValue("[%s]", nullptr), "[]");
+  EXPECT_EQ(FormatRootValue("%s%s", std::string(300, 'a').c_str()), std::string(255, 'a'));
+  EXPECT_EQ(FormatRootValue(nullptr, "x"), "");
 }
 
-TEST(FormatRootValue, ConversionsAndLimit) {
-  const std::string long_arg(300, 'a');
-  struct Row {
-    const char* what;
-    const char* value;
-    const char* argument;
-    std::string expected;
-  } rows[] = {
-      {"%s takes the argument", "<%s>", "x", "<x>"},
-      {"%% gives %", "%%s", "x", "%s"},
-      {"other conversions stay text", "%d %n %p %-5s", "x", "%d %n %p %-5s"},
-      {"a trailing % stays", "50%", "x", "50%"},
-      {"NULL argument is empty", "[%s]", nullptr, "[]"},
-      {"cut to 255", "%s%s", long_arg.c_str(), std::string(255, 'a')},
-      {"NULL value", nullptr, "x", ""},
-  };
-  for (const auto& row : rows) EXPECT_EQ(FormatRootValue(row.value, row.argument), row.expected) << row.what;
-}
-
-TEST_F(SettingsTest, FoundPathUsesForwardSlashes) {
-  WriteIni("Trace=1");
-  ScopedEnv backslashed("TEXMF", dir_ / "tex\\");
-  Docuvane_Init();
-  EXPECT_EQ(IniFilePath, dir_ / "tex/Docuvane/Docuvane.ini");
-  EXPECT_EQ(TraceMode, 1);
-}
-
-TEST_F(SettingsTest, NoIniFileAnywhere) {
+TEST_F(SettingsTest, TracesAndTheWordIndexOpenedOrNot) {
   MessageCapture capture;
-  EXPECT_EQ(Docuvane_Init(), 1);
-  EXPECT_EQ(IniFilePath, "Docuvane.INI");
-  EXPECT_EQ(TraceMode, 0);
-  EXPECT_EQ(RootPath, "");
-  const char* expected[] = {
-      "Docuvane: Docuvane_Init --- Start",
-      "Docuvane: Private INI file: Docuvane.INI",
-      "Docuvane: Docuvane_Init --- WXFileName=",
-      "Docuvane: Docuvane --- End",
-  };
-  std::size_t at = 0;
-  for (const auto& m : capture.messages())
-    if (at < std::size(expected) && m.line() == expected[at]) ++at;
-  EXPECT_EQ(at, std::size(expected)) << "traces in order; missing from: " << (at < 4 ? expected[at] : "");
-  EXPECT_EQ(capture.messages().back().line(), "Docuvane: Docuvane --- End");
-}
+  EXPECT_EQ(Init("etc/unused.ini", ""), 1);
+  std::string lines;
+  for (const auto& m : capture.messages()) lines += m.line() + "|";
+  EXPECT_EQ(lines,
+            "Docuvane: Docuvane_Init --- Start|Docuvane: Private INI file: Docuvane.INI|"
+            "Docuvane: Document Word Index File: NOT FOUND|Docuvane: Docuvane_Init --- WXFileName=|"
+            "Docuvane: Docuvane --- End|");
 
-TEST_F(SettingsTest, BareNameFallsBackToTheSystemDirectory) {
-  dir_.Write("etc/Docuvane.ini", "[Setup]\nTrace=6\nRoot=/sys\n");
-  ProfileCacheClear();
-  Docuvane_Init();
-  EXPECT_EQ(IniFilePath, "Docuvane.INI");
-  EXPECT_EQ(TraceMode, 6);
-  EXPECT_EQ(RootPath, "/sys");
-}
-
-TEST_F(SettingsTest, WordIndexOpenedOrNot) {
-  WriteIni("Trace=0");
   dir_.Write("tex/Update/command.Index", "not an index");
-  TrovResetCaches();
-  MessageCapture capture;
-  EXPECT_EQ(Docuvane_Init(), 1);
+  Init("tex/Docuvane/Docuvane.ini", "");
   EXPECT_EQ(WordIndexPath, dir_ / "tex/Update/command.Index");
   EXPECT_TRUE(capture.Contains("Docuvane_Init --- WXFileName=" + WordIndexPath));
   EXPECT_EQ(WordIndexHandle, nullptr) << "a damaged index is refused";
-  EXPECT_EQ(capture.messages().back().line(), "Docuvane: Docuvane --- End");
-
-  const std::filesystem::path good =
-      std::filesystem::path(DOCUVANE_FUZZ_CORPUS) / "wordindex" / "worked-example.Index";
-  if (!std::filesystem::exists(good)) GTEST_SKIP() << "no sample index at " << good;
-  std::filesystem::copy_file(good, dir_ / "tex/Update/command.Index",
-                             std::filesystem::copy_options::overwrite_existing);
-  WordIndexPath.clear();
-  Docuvane_Init();
+  std::filesystem::copy_file(
+      std::filesystem::path(DOCUVANE_FUZZ_CORPUS) / "wordindex/worked-example.Index",
+      dir_ / "tex/Update/command.Index", std::filesystem::copy_options::overwrite_existing);
+  Init("tex/Docuvane/Docuvane.ini", "");
   EXPECT_NE(WordIndexHandle, nullptr);
+  CloseWordIndex();
+}
+
+TEST(TraceMessage, LevelFromTheWordsAndJoinWithin511) {
+  const std::string text_510(510, 'a');
+  struct Row {
+    const char* what;
+    std::string text;
+    const char* argument;
+    std::string expected;
+    int level;
+  } rows[] = {
+      {"text and argument, no separator added", "Private INI file: ", "D.INI",
+       "Private INI file: D.INI", 1},
+      {"NULL argument gives the text alone", "Start", nullptr, "Start", 1},
+      {"Run at the start", "", "Run viewer", "Run viewer", 2},
+      {"Open at the start wins over ERROR", "Openning document file: ", "ERROR.pdf",
+       "Openning document file: ERROR.pdf", 2},
+      {"Launch at the start wins over WARNING", "Launch WARNING", nullptr, "Launch WARNING", 2},
+      {"WARNING anywhere, and over ERROR", "ERROR and WARNING", nullptr, "ERROR and WARNING", 3},
+      {"ERROR anywhere, also in the argument", "Attach document: ", "/x/ERROR/y.pdf",
+       "Attach document: /x/ERROR/y.pdf", 4},
+      {"lower case is plain", "run a warning error", nullptr, "run a warning error", 1},
+      {"a word inside is not a beginning", " Run", nullptr, " Run", 1},
+      {"a long text is cut to 511 and the argument dropped", std::string(600, 't'), "ERROR",
+       std::string(511, 't'), 1},
+      {"the argument is cut so that the whole stays 511", text_510, "ERROR", text_510 + "E", 1},
+  };
+  for (const auto& row : rows) {
+    MessageCapture capture;
+    TraceMessage(row.text.c_str(), row.argument);
+    ASSERT_EQ(capture.messages().size(), 1u) << row.what;
+    const auto& m = capture.messages()[0];
+    EXPECT_EQ(m.prefix + "|" + m.text, "Docuvane: |" + row.expected) << row.what;
+    EXPECT_EQ(m.level, row.level) << row.what;
+    EXPECT_EQ(TraceLevelOf(row.expected.c_str()), row.level) << row.what;
+  }
 }
 
 }  // namespace
