@@ -1,63 +1,59 @@
-// The word index file: the worked example, lookups at group edges, labels,
-// header refusals and the decoding of reference blocks.
-#include "wordindex/wordindex.h"
-
+// The word index: file reader, reference blocks, word list, keyword targets,
+// finding the file, and the replay of the fuzz corpus.
 #include <gtest/gtest.h>
 
-#include <cstring>
-#include <functional>
+#include <filesystem>
+#include <fstream>
+#include <iterator>
 #include <sstream>
-#include <string>
-#include <vector>
+#include <tuple>
 
+#include "catalogue/documents.h"
+#include "catalogue/keywords.h"
+#include "fuzz/wordindex_target.h"
 #include "test_support.h"
 #include "wordindex/index_writer.h"
-#include "wordindex/references.h"
+#include "wordindex/locate.h"
 
 using testing_support::MessageCapture;
+using testing_support::ScopedEnv;
 using testing_support::TempDir;
+using Bytes = std::vector<uint8_t>;
 
 namespace {
 
-std::vector<uint8_t> BuildIndex(const std::string& listing,
-                                WordIndexBuilder::Form form = WordIndexBuilder::Form::Compact) {
+Bytes BuildIndex(const std::string& listing, bool longForm = false) {
   WordIndexBuilder builder;
   std::istringstream in(listing);
   std::string error;
-  EXPECT_TRUE(builder.AddListing(in, error)) << error;
-  std::vector<uint8_t> bytes;
-  EXPECT_TRUE(builder.Build(form, bytes, error)) << error;
+  Bytes bytes;
+  const auto form = longForm ? WordIndexBuilder::Form::Long : WordIndexBuilder::Form::Compact;
+  EXPECT_TRUE(builder.AddListing(in, error) && builder.Build(form, bytes, error)) << error;
   return bytes;
 }
 
-bool Open(const std::vector<uint8_t>& bytes) {
-  return OpenWordIndexFromMemory(bytes.data(), bytes.size(), "mem.Index") == 1;
+bool Open(const Bytes& b) { return OpenWordIndexFromMemory(b.data(), b.size(), "mem.Index") == 1; }
+
+void Set(Bytes& b, std::size_t at, uint32_t value, int width) {
+  for (int i = width - 1; i >= 0; --i, value >>= 8) b[at + i] = static_cast<uint8_t>(value);
 }
 
-// The word stored in the block a lookup returned.
-std::string BlockWord(int32_t offset) {
-  unsigned char n = 0;
-  if (!ReadIndexBytes(offset, &n, 1)) return "<unreadable>";
-  std::string word(n, '\0');
-  if (!ReadIndexBytes(offset + 4, word.data(), n)) return "<unreadable>";
-  return word;
+Bytes ReadFile(const std::filesystem::path& path) {
+  std::ifstream in(path, std::ios::binary);
+  return Bytes(std::istreambuf_iterator<char>(in), std::istreambuf_iterator<char>());
 }
 
-std::vector<std::string> References(const char* word) {
+std::string Join(const std::vector<std::string>& items) {
+  std::string joined;
+  for (const std::string& item : items) joined += item + "|";
+  return joined;
+}
+
+// The Locations items of an indexed word, joined; "" when it is not found.
+std::string References(const char* word) {
   std::vector<std::string> items;
-  int32_t offset = FindIndexWord(word);
-  if (offset != 0) LoadWordReferences(offset, word, items);
-  return items;
-}
-
-uint32_t Get(const std::vector<uint8_t>& b, std::size_t at, int width) {
-  uint32_t v = 0;
-  for (int i = 0; i < width; ++i) v = (v << 8) | b[at + i];
-  return v;
-}
-
-void Set(std::vector<uint8_t>& b, std::size_t at, uint32_t v, int width) {
-  for (int i = width - 1; i >= 0; --i, v >>= 8) b[at + i] = static_cast<uint8_t>(v);
+  if (int32_t offset = FindIndexWord(word)) LoadWordReferences(offset, word, items);
+  return Join(items);
 }
 
 class WordIndexTest : public ::testing::Test {
@@ -66,299 +62,247 @@ class WordIndexTest : public ::testing::Test {
   MessageCapture messages;
 };
 
-const uint8_t kWorkedExample[44] = {
-    0x57, 0x58, 0x03, 0x03, 0x00, 0x00, 0x00, 0x14, 0x00, 0x00, 0x00, 0x1C, 0x00, 0x01, 0x00,
-    0x00, 0x27, 0x00, 0x00, 0x2C, 0x61, 0x62, 0x63, 0x00, 0x00, 0x00, 0x1C, 0x00, 0x03, 0x00,
-    0x00, 0x04, 0x61, 0x62, 0x63, 0x80, 0x01, 0x00, 0x07, 0x78, 0x2E, 0x70, 0x64, 0x66};
-
-TEST_F(WordIndexTest, WorkedExampleIsWrittenAndReadByteForByte) {
-  std::vector<uint8_t> bytes = BuildIndex("abc\tx.pdf\t7\n");
-  ASSERT_EQ(bytes, std::vector<uint8_t>(kWorkedExample, kWorkedExample + 44));
-
-  TempDir dir;
-  std::string path = dir.Write("command.Index", std::string(bytes.begin(), bytes.end()));
-  ASSERT_EQ(OpenWordIndex(path.c_str()), 1);
-  EXPECT_EQ(WordIndexSize, 44);
-  EXPECT_EQ(MinWordLength, 3);
-  EXPECT_EQ(MaxWordLength, 3);
-  EXPECT_EQ(LabelCount, 1);
-  EXPECT_EQ(FindIndexWord("abc"), 28);
-  EXPECT_EQ(References("abc"), std::vector<std::string>{"x.pdf#page=7 "});
-}
-
-TEST_F(WordIndexTest, MissingFileAndBadSignatureLeaveNoIndex) {
-  TempDir dir;
-  std::string missing = dir / "nothing.Index";
-  EXPECT_EQ(OpenWordIndex(missing.c_str()), 0);
-  EXPECT_TRUE(messages.Contains("ERROR: Can't open Word Index file: " + missing));
-  for (const char* head : {"XW", "wx"}) {
-    std::vector<uint8_t> bytes(kWorkedExample, kWorkedExample + 44);
-    bytes[0] = head[0];
-    bytes[1] = head[1];
-    std::string path = dir.Write(head, std::string(bytes.begin(), bytes.end()));
-    messages.clear();
-    EXPECT_EQ(OpenWordIndex(path.c_str()), 0);
-    EXPECT_TRUE(messages.Contains("ERROR: Invalid signature of Word Index file " + path));
-    EXPECT_EQ(WordIndexHandle, nullptr);
-  }
-}
-
-TEST_F(WordIndexTest, LookupFindsEveryWordAtGroupEdgesAndNothingElse) {
-  // Lengths 1 (one record), 3 (several, case-distinct), 6 (one record); 2,
-  // 4 and 5 are empty groups.
-  ASSERT_TRUE(Open(BuildIndex(
-      "q\ta.pdf\t1\n"
-      "Abc\ta.pdf\t2\nabc\ta.pdf\t3\nabd\tb.pdf\t4\naaa\tb.pdf\t5\nzzz\ta.pdf\t6\nABC\ta.pdf\t7\n"
-      "\\begin\tb.pdf\t8\n")));
-  ASSERT_EQ(MinWordLength, 1);
-  ASSERT_EQ(MaxWordLength, 6);
-  struct Row {
-    const char* word;
-    bool found;
-    const char* why;
+TEST_F(WordIndexTest, LookupAtGroupEdges) {
+  // Lengths 1 and 6 hold one word each, 3 several; 2, 4 and 5 are empty.
+  ASSERT_TRUE(
+      Open(BuildIndex("q\ta\t1\nAbc\ta\t2\nabc\ta\t3\nabd\ta\t4\naaa\ta\t5\nzzz\ta\t6\n"
+                      "ABC\ta\t7\n\\begin\ta\t8\n")));
+  // word, its page or 0, what
+  const std::tuple<const char*, int, const char*> rows[] = {
+      {"q", 1, "only word of its group"},     {"p", 0, "before the only word"},
+      {"r", 0, "after the only word"},        {"ABC", 7, "first of its group"},
+      {"zzz", 6, "last of its group"},        {"abc", 3, "case-distinct neighbour"},
+      {"aBc", 0, "other capitals"},           {"abd", 4, "middle word"},
+      {"AAA", 0, "below every word"},         {"zzzz", 0, "length of an empty group"},
+      {"\\begi", 0, "empty group below max"}, {"\\begin", 8, "longest word"},
+      {"", 0, "shorter than the shortest"},   {"\\begins", 0, "longer than the longest"},
   };
-  const Row rows[] = {
-      {"q", true, "only record of a one-record group"},
-      {"p", false, "before the only record"},
-      {"r", false, "after the only record"},
-      {"ABC", true, "first record of its group"},
-      {"zzz", true, "last record of its group"},
-      {"Abc", true, "case-distinct neighbour"},
-      {"abc", true, "case-distinct neighbour"},
-      {"aBc", false, "other capitals are another key"},
-      {"aaa", true, "middle record"},
-      {"abd", true, "middle record"},
-      {"AAA", false, "smaller than every record"},
-      {"zzzz", false, "length of an empty group"},
-      {"\\begin", true, "longest length, one record"},
-      {"\\begi", false, "empty group just below the longest"},
-      {"", false, "shorter than the shortest word"},
-      {"\\begins", false, "longer than the longest word"},
-  };
-  for (const Row& row : rows) {
-    int32_t offset = FindIndexWord(row.word);
-    if (row.found) {
-      EXPECT_NE(offset, 0) << row.why << ": " << row.word;
-      EXPECT_EQ(BlockWord(offset), row.word) << row.why;
-    } else {
-      EXPECT_EQ(offset, 0) << row.why << ": " << row.word;
-    }
+  for (const auto& [word, page, what] : rows)
+    EXPECT_EQ(References(word), page ? "a#page=" + std::to_string(page) + " |" : "") << what;
+  // A word whose block starts at the end of the file, or whose block header passes it.
+  Bytes bytes = BuildIndex("abc\tx.pdf\t7\n");
+  for (uint32_t block : {44u, 41u, 40u}) {
+    Set(bytes, 23, block, 4);
+    ASSERT_TRUE(Open(bytes));
+    EXPECT_EQ(FindIndexWord("abc"), block == 40 ? 40 : 0) << block;
   }
 }
 
 TEST_F(WordIndexTest, LabelReadKeepsTheStreamPosition) {
   ASSERT_TRUE(Open(BuildIndex("w\tdoc/first.pdf\t1\nx\tsecond.pdf\t2\n")));
-  ASSERT_EQ(LabelCount, 2);
-  const int32_t offset = FindIndexWord("w");
   unsigned char header[4];
-  ASSERT_TRUE(ReadIndexBytes(offset, header, 4));
+  ASSERT_TRUE(ReadIndexBytes(FindIndexWord("w"), header, 4));
   char label[kLabelBufferSize];
   EXPECT_EQ(ReadIndexLabel(2, label), 10);
   EXPECT_STREQ(label, "second.pdf");
-  // The next byte read from the stream is the block's word, not label bytes.
-  EXPECT_EQ(fgetc(WordIndexHandle), 'w');
-
-  struct Row {
-    int index;
-    std::size_t size;
-    const char* expected;
-  };
-  const Row rows[] = {
+  EXPECT_EQ(fgetc(WordIndexHandle), 'w');  // the block's word, read on from before
+  // index, buffer size, label
+  const std::tuple<int, std::size_t, const char*> rows[] = {
       {1, 256, "doc/first.pdf"}, {1, 4, "doc"}, {0, 256, ""}, {3, 256, ""}, {-1, 256, ""}};
-  for (const Row& row : rows) {
-    std::vector<char> buffer(row.size, 'z');
-    EXPECT_EQ(ReadIndexLabel(row.index, buffer.data(), row.size),
-              static_cast<int>(strlen(row.expected)));
-    EXPECT_STREQ(buffer.data(), row.expected) << "label " << row.index;
+  for (const auto& [index, size, expected] : rows) {
+    std::vector<char> buffer(size, 'z');
+    EXPECT_EQ(ReadIndexLabel(index, buffer.data(), size), int(strlen(expected))) << index;
+    EXPECT_STREQ(buffer.data(), expected) << "label " << index;
   }
 }
 
-TEST_F(WordIndexTest, ZeroLabelsAndNoWordsStillOpen) {
-  // LabelCount 0 still has one label offset.
-  std::vector<uint8_t> bytes = BuildIndex("");
-  ASSERT_EQ(bytes.size(), 4u + 4 + 2 + 3);
-  ASSERT_TRUE(Open(bytes));
-  EXPECT_EQ(LabelCount, 0);
-  EXPECT_EQ(FindIndexWord("a"), 0);
-  EXPECT_EQ(FindIndexWord(""), 0);
-}
-
-TEST_F(WordIndexTest, DamagedHeadersAreRefusedWithAMessage) {
-  // Two words of lengths 2 and 3, two labels: group offsets at 4, 8, 12,
-  // LabelCount at 16, label offsets at 18, 21, 24; records from 27.
-  const std::vector<uint8_t> valid = BuildIndex("ab\tone.pdf\t1\nabc\ttwo.pdf\t2\n");
-  ASSERT_EQ(Get(valid, 2, 1), 2u);
-  ASSERT_EQ(Get(valid, 3, 1), 3u);
-  ASSERT_EQ(Get(valid, 4, 4), 27u);
+TEST_F(WordIndexTest, DamagedHeadersAreRefused) {
+  // Lengths 2 and 3, two labels: group offsets at 4, 8, 12, LabelCount at 16,
+  // label offsets at 18, 21, 24; records from 27.
+  const Bytes valid = BuildIndex("ab\tone.pdf\t1\nabc\ttwo.pdf\t2\n");
+  ASSERT_EQ(valid[7], 27);
   ASSERT_TRUE(Open(valid));
-  CloseWordIndex();
-
-  struct Row {
-    const char* what;
-    std::function<void(std::vector<uint8_t>&)> damage;
-    const char* message;
-  };
+  ASSERT_TRUE(Open(BuildIndex("")));  // no words and no labels is still an index
   const uint32_t size = static_cast<uint32_t>(valid.size());
-  const Row rows[] = {
-      {"first group offset inside the header", [](auto& b) { Set(b, 4, 20, 4); }, "header"},
-      {"group offsets going backwards", [](auto& b) { Set(b, 8, 26, 4); }, "out of order"},
-      {"group offset past the end", [&](auto& b) { Set(b, 8, size + 1, 4); }, "outside"},
-      {"record area overrunning the file", [&](auto& b) { Set(b, 12, size + 7, 4); }, "outside"},
-      {"huge group offset", [](auto& b) { Set(b, 12, 0xFFFFFFF0u, 4); }, "outside"},
-      {"LabelCount 8191", [](auto& b) { Set(b, 16, 8191, 2); }, "Too many labels"},
-      {"LabelCount 65535", [](auto& b) { Set(b, 16, 65535, 2); }, "Too many labels"},
-      {"LabelCount larger than the file holds", [](auto& b) { Set(b, 16, 4000, 2); }, "truncated"},
-      {"label beyond the end", [&](auto& b) { Set(b, 24, size + 1, 3); }, "outside"},
-      {"label offsets going backwards", [](auto& b) { Set(b, 21, 1, 3); }, "out of order"},
-      {"max length two below min", [](auto& b) { Set(b, 3, 0, 1); }, "word lengths"},
-      {"max length 255 with a short file", [](auto& b) { Set(b, 3, 255, 1); }, "truncated"},
+  // what, where, new value, its width, message
+  const std::tuple<const char*, std::size_t, uint32_t, int, const char*> rows[] = {
+      {"signature XW", 0, 0x5857, 2, "Invalid signature"},
+      {"first group offset inside the header", 4, 20, 4, "header"},
+      {"group offsets going backwards", 8, 26, 4, "out of order"},
+      {"group offset one past the end", 8, size + 1, 4, "outside"},
+      {"huge end of the records", 12, 0xFFFFFFF0u, 4, "outside"},
+      {"LabelCount 8191", 16, 8191, 2, "Too many labels"},
+      {"LabelCount beyond what the file holds", 16, 4000, 2, "truncated"},
+      {"label offset one past the end", 24, size + 1, 3, "outside"},
+      {"label offsets going backwards", 21, 1, 3, "out of order"},
+      {"max length two below min", 3, 0, 1, "word lengths"},
+      {"max length 255 in a short file", 3, 255, 1, "truncated"},
   };
-  for (const Row& row : rows) {
-    std::vector<uint8_t> bytes = valid;
-    row.damage(bytes);
+  for (const auto& [what, at, value, width, message] : rows) {
+    Bytes bytes = valid;
+    Set(bytes, at, value, width);
     messages.clear();
-    EXPECT_FALSE(Open(bytes)) << row.what;
-    EXPECT_EQ(WordIndexHandle, nullptr) << row.what;
-    EXPECT_TRUE(messages.Contains("ERROR: ")) << row.what;
-    EXPECT_TRUE(messages.Contains(row.message)) << row.what;
-    EXPECT_TRUE(messages.Contains("mem.Index")) << row.what;
+    EXPECT_FALSE(Open(bytes)) << what;
+    EXPECT_EQ(WordIndexHandle, nullptr) << what;
+    EXPECT_TRUE(messages.Contains("ERROR: ") && messages.Contains(message) &&
+                messages.Contains("mem.Index"))
+        << what;
   }
-
-  // Every cut of the file loses at least the end of the last label.
   for (std::size_t length = 0; length < valid.size(); ++length) {
     messages.clear();
-    EXPECT_EQ(OpenWordIndexFromMemory(valid.data(), length, "mem.Index"), 0) << "cut at " << length;
-    EXPECT_EQ(WordIndexHandle, nullptr);
+    EXPECT_EQ(OpenWordIndexFromMemory(valid.data(), length, "cut"), 0) << length;
     EXPECT_TRUE(messages.Contains("ERROR: ")) << "cut at " << length;
   }
+  EXPECT_EQ(OpenWordIndex("/nonexistent/command.Index"), 0);
+  EXPECT_TRUE(messages.Contains("ERROR: Can't open Word Index file: /nonexistent/command.Index"));
 }
 
-TEST_F(WordIndexTest, RecordPointingOutsideTheFileIsNotFound) {
-  std::vector<uint8_t> bytes(kWorkedExample, kWorkedExample + 44);
-  Set(bytes, 23, 44, 4);  // reference block at the very end
-  ASSERT_TRUE(Open(bytes));
-  EXPECT_EQ(FindIndexWord("abc"), 0);
-  Set(bytes, 23, 41, 4);  // header would run past the end
-  ASSERT_TRUE(Open(bytes));
-  EXPECT_EQ(FindIndexWord("abc"), 0);
-  Set(bytes, 23, 40, 4);
-  ASSERT_TRUE(Open(bytes));
-  EXPECT_EQ(FindIndexWord("abc"), 40);
-}
-
-// Labels b.pdf (1), c.pdf (2), a.pdf (3), then the word w of each example.
-const char kLabels[] = "x\tb.pdf\t1\nx\tc.pdf\t1\nx\ta.pdf\t1\n";
-
-TEST_F(WordIndexTest, ReferenceBlocksInBothForms) {
-  ASSERT_TRUE(Open(BuildIndex(std::string(kLabels) + "w\ta.pdf\t12 15\nw\tb.pdf\t\n")));
-  int32_t offset = FindIndexWord("w");
-  unsigned char entries[8];
-  ASSERT_TRUE(ReadIndexBytes(offset + 5, entries, 8));
-  EXPECT_EQ(std::vector<uint8_t>(entries, entries + 8),
-            (std::vector<uint8_t>{0x80, 0x03, 0x00, 0x0C, 0x00, 0x0F, 0x80, 0x01}));
-  std::vector<std::string> items;
-  EXPECT_EQ(LoadWordReferences(offset, "w", items), 2);
-  EXPECT_EQ(items, (std::vector<std::string>{"a.pdf#page=12 15 ", "b.pdf#page="}));
-
-  ASSERT_TRUE(Open(BuildIndex(std::string(kLabels) + "w\ta.pdf\t12 15\nw\tb.pdf\t2\n",
-                              WordIndexBuilder::Form::Long)));
-  EXPECT_EQ(References("w"), (std::vector<std::string>{"a.pdf#page=12 15 ", "b.pdf#page=2 "}));
-  // The block's label is checked ignoring case.
-  offset = FindIndexWord("w");
-  items.clear();
-  EXPECT_EQ(LoadWordReferences(offset, "W", items), 2);
-}
-
-TEST_F(WordIndexTest, PageListStopsAtTwoHundredCharacters) {
-  const std::string label = std::string(187, 'd') + ".pdf";  // 191 + "#page=" = 197
-  ASSERT_TRUE(Open(BuildIndex("w\t" + label + "\t1 22 333 4444\n")));
-  EXPECT_EQ(References("w"), std::vector<std::string>{label + "#page=1 22 "});
-}
-
-TEST_F(WordIndexTest, DamagedReferenceBlocks) {
-  const std::string listing = std::string(kLabels) + "w\ta.pdf\t12 15\nw\tb.pdf\t2\n";
-  struct Row {
-    const char* what;
-    WordIndexBuilder::Form form;
-    std::vector<uint8_t> entries;  // written over the block's first entries
-    std::vector<std::string> items;
-    int count;
-    const char* message;
+TEST_F(WordIndexTest, ReferenceBlocks) {
+  using namespace std::string_literals;
+  const std::string labels = "x\tb\t1\nx\tc\t1\nx\ta\t1\n";  // labels b 1, c 2, a 3
+  const Bytes compact = BuildIndex(labels + "w\ta\t12 15\nw\tb\t2\n");
+  const Bytes longForm = BuildIndex(labels + "w\ta\t12 15\nw\tb\t2\n", true);
+  const Bytes bare = BuildIndex(labels + "w\ta\t12 15\nw\tb\t\n");
+  const std::string label(189, 'd');  // with "#page=1 22 ": 200 characters
+  const Bytes cut = BuildIndex("w\t" + label + "\t1 22 333 4444\n");
+  // Its last block's size S claims 0xFFFFFF bytes: one entry and an odd byte follow.
+  const Bytes pastEnd = ReadFile(DOCUVANE_FUZZ_CORPUS "/wordindex/entries-past-end.Index");
+  // what, index, bytes written over the block from its word on, items, message
+  const std::tuple<const char*, const Bytes&, std::string, std::string, const char*> rows[] = {
+      {"compact", bare, "", "a#page=12 15 |b#page=|", ""},
+      {"long", longForm, "", "a#page=12 15 |b#page=2 |", ""},
+      {"pages stop once the text reaches 200", cut, "", label + "#page=1 22 |", ""},
+      {"compact label 0: its pages go too", compact, "w\x80\0\0\x0C"s, "b#page=2 |", "no label"},
+      {"compact label above LabelCount", compact, "w\x80\x04"s, "b#page=2 |", "no label"},
+      {"long label 0 first", longForm, "w\0\0\0\x0C"s, "a#page=15 |b#page=2 |", ""},
+      {"long label 32767", longForm, "w\0\3\0\x0C\x7F\xFF"s, "a#page=12 |b#page=2 |", "no label"},
+      {"long label returning", longForm, "w\0\3\0\x0C\0\1\0\x0F\0\3"s,
+       "a#page=12 |b#page=15 |a#page=2 |", ""},
+      {"mismatched label", compact, "v", "", "ERROR: Mismatched References label: v"},
+      {"S past the end of the file", pastEnd, "", "x#page=9 |", "WARNING: References cut"},
   };
-  const auto compact = WordIndexBuilder::Form::Compact;
-  const auto longForm = WordIndexBuilder::Form::Long;
-  const Row rows[] = {
-      {"compact label 0 drops its pages",
-       compact,
-       {0x80, 0x00, 0x00, 0x0C},
-       {"b.pdf#page=2 "},
-       1,
-       "no label"},
-      {"compact label above LabelCount", compact, {0x80, 0x04}, {"b.pdf#page=2 "}, 1, "no label"},
-      {"long label 0 first: pages dropped",
-       longForm,
-       {0x00, 0x00, 0x00, 0x0C},
-       {"a.pdf#page=15 ", "b.pdf#page=2 "},
-       2,
-       nullptr},
-      {"long label above LabelCount",
-       longForm,
-       {0x00, 0x03, 0x00, 0x0C, 0x7F, 0xFF, 0x00, 0x0F},
-       {"a.pdf#page=12 ", "b.pdf#page=2 "},
-       2,
-       "no label"},
-      {"long label returning starts a second item",
-       longForm,
-       {0x00, 0x03, 0x00, 0x0C, 0x00, 0x01, 0x00, 0x0F, 0x00, 0x03, 0x00, 0x02},
-       {"a.pdf#page=12 ", "b.pdf#page=15 ", "a.pdf#page=2 "},
-       3,
-       nullptr},
-  };
-  for (const Row& row : rows) {
-    std::vector<uint8_t> bytes = BuildIndex(listing, row.form);
-    ASSERT_TRUE(Open(bytes));
+  for (const auto& [what, index, patch, expected, message] : rows) {
+    Bytes bytes = index;
+    ASSERT_TRUE(Open(bytes)) << what;
     const int32_t offset = FindIndexWord("w");
-    std::copy(row.entries.begin(), row.entries.end(), bytes.begin() + offset + 5);
-    ASSERT_TRUE(Open(bytes));
+    std::copy(patch.begin(), patch.end(), bytes.begin() + offset + 4);
+    ASSERT_TRUE(Open(bytes)) << what;
     messages.clear();
-    std::vector<std::string> items;
-    EXPECT_EQ(LoadWordReferences(offset, "w", items), row.count) << row.what;
-    EXPECT_EQ(items, row.items) << row.what;
-    if (row.message) EXPECT_TRUE(messages.Contains(row.message)) << row.what;
+    std::vector<std::string> items{"before"};
+    const int count = LoadWordReferences(offset, "W", items);  // label matched ignoring case
+    EXPECT_EQ(count + 1, int(items.size())) << what;
+    EXPECT_EQ(Join(items), "before|" + expected) << what;
+    EXPECT_TRUE(!*message || messages.Contains(message)) << what;
   }
-}
-
-TEST_F(WordIndexTest, LabelMismatchLeavesTheListAlone) {
-  std::vector<uint8_t> bytes = BuildIndex("w\ta.pdf\t1\n");
-  ASSERT_TRUE(Open(bytes));
-  const int32_t offset = FindIndexWord("w");
-  bytes[offset + 4] = 'v';
-  ASSERT_TRUE(Open(bytes));
-  std::vector<std::string> items{"kept"};
-  EXPECT_EQ(LoadWordReferences(offset, "w", items), 0);
-  EXPECT_EQ(items, std::vector<std::string>{"kept"});
-  EXPECT_TRUE(messages.Contains("ERROR: Mismatched References label: v"));
-}
-
-TEST_F(WordIndexTest, EntryListReachingPastTheEndIsCut) {
-  // A hand-laid file whose only block is last: S claims 0xFFFFFF bytes but
-  // only one label start and one page follow.
-  std::vector<uint8_t> bytes = {'W', 'X', 1,    1,    0,    0,   0,    20,   0,    0,    0,   26, 0,
-                                1,   0,   0,    26,   0,    0,   27,   'w',  0,    0,    0,   27, 0,
-                                'x', 1,   0xFF, 0xFF, 0xFF, 'w', 0x80, 0x01, 0x00, 0x09, 0x00};
-  ASSERT_TRUE(Open(bytes));
-  ASSERT_EQ(FindIndexWord("w"), 27);
+  ASSERT_TRUE(Open(pastEnd));
   std::vector<std::string> items;
-  EXPECT_EQ(LoadWordReferences(27, "w", items), 1);
-  EXPECT_EQ(items, std::vector<std::string>{"x#page=9 "});  // the odd last byte is no entry
-  EXPECT_TRUE(messages.Contains("WARNING: References cut"));
+  for (int32_t at : {33, 35, 36})  // the block header or its label runs past the end
+    EXPECT_EQ(LoadWordReferences(at, "w", items) + items.size(), 0u) << at;
+}
 
-  // A block whose header or label runs past the end gives nothing.
-  for (int32_t at : {33, 35, 36}) {
-    items.clear();
-    EXPECT_EQ(LoadWordReferences(at, "w", items), 0) << at;
-    EXPECT_TRUE(items.empty());
+TEST_F(WordIndexTest, WordListSkipsAtWordsAndSorts) {
+  WordListData data;
+  EXPECT_EQ(Fill_WordIndex(data), 0);  // no index open
+  ASSERT_TRUE(
+      Open(BuildIndex("{align}\ta\t1\n\\alpha\ta\t1\n\\@ifnextchar\ta\t1\n\\section\ta\t1\n"
+                      "zeta@\ta\t1\n{tabular}\ta\t1\n\\Beta\ta\t1\n\\\\\ta\t1\n{\ta\t1\n")));
+  const int commands = CommandWordCount, environments = EnvironmentWordCount;
+  ASSERT_EQ(Fill_WordIndex(data), 1);
+  EXPECT_EQ(CommandWordCount - commands, 4);
+  EXPECT_EQ(EnvironmentWordCount - environments, 3);
+  EXPECT_TRUE(messages.Contains("Skipped index word: \\@ifnextchar"));
+  EXPECT_TRUE(messages.Contains("Skipped index word: zeta@"));
+  EXPECT_NE(FindIndexWord("\\@ifnextchar"), 0);  // still there for lookups
+  // "{" and "\\" compare as "" and "\".
+  EXPECT_EQ(Join({data.Words.begin(), data.Words.end()}),
+            "{|\\\\|{align}|\\alpha|\\Beta|\\section|{tabular}|");
+  // Marks and case aside, equal; bytes are unsigned; letters fold to lower case.
+  const std::tuple<const char*, const char*, int> order[] = {
+      {"\\alpha", "Alpha", 0}, {"\xE9", "z", 1}, {"[", "a", -1}};
+  for (const auto& [a, b, sign] : order) {
+    const int got = CompareIndexWords(a, b);
+    EXPECT_EQ((got > 0) - (got < 0), sign) << a << " vs " << b;
   }
+
+  const std::vector<const char*> words = {"{align}",   "\\alpha",   "\\Section", "\\section",
+                                          "sectional", "{section}", "sec"};
+  // text, exact, row, what
+  const std::tuple<const char*, int, int, const char*> find[] = {
+      {"", 0, 0, "empty text: first row"},
+      {"SEC", 0, 2, "prefix ignores case and the words' marks"},
+      {"\\sec", 0, 2, "a backslash text matches backslash words only"},
+      {"{sec", 0, 5, "a brace text matches brace words only"},
+      {"section", 1, 3, "exact match, case included"},
+      {"sectio", 1, 2, "no exact match: first prefix"},
+      {"sec", 1, 6, "exact match after other prefixes"},
+      {"alpha}", 0, -1, "longer than every word"},
+  };
+  for (const auto& [text, exact, row, what] : find)
+    EXPECT_EQ(FindWordInList(words, text, exact), row) << what;
+  EXPECT_EQ(FindWordInList({}, "", 0), -1);
+}
+
+TEST(KeywordTargetsTest, SingleTargetMissingDocumentAndTooLong) {
+  KeywordListReset();
+  const std::vector<DocumentEntry> saved(DocumentTable, DocumentTable + 2);
+  const int savedCount = DocumentCount;
+  DocumentTable[0].Path = "/d/amsldoc.pdf";
+  DocumentTable[1].Path = "/d/" + std::string(110, 'x') + ".pdf";  // 117 bytes
+  DocumentCount = 2;
+  AddKeywordTarget("{align}", "eq", 0);
+  AddKeywordTarget("\\bad", "gone", 7);  // no such document
+  AddKeywordTarget("\\bad", "kept", 0);
+  AddKeywordTarget("\\long", "aaaaaaaaaa", 1);  // 128 characters
+  AddKeywordTarget("\\fits", "aaaaaaaaa", 1);   // 127 characters
+  const std::string fits = DocumentTable[1].Path + "#aaaaaaaaa";
+  // word, items, the single target
+  const std::tuple<const char*, std::string, std::string> rows[] = {
+      {"{ALIGN}", "/d/amsldoc.pdf#eq|", "/d/amsldoc.pdf#eq"},
+      {"\\bad", "/d/amsldoc.pdf#kept|", ""},
+      {"\\long", "", ""},
+      {"\\fits", fits + "|", fits},
+      {"\\sec", "", ""},
+  };
+  MessageCapture messages;
+  for (const auto& [word, items, single] : rows) {
+    const KeywordTargets t = CollectKeywordTargets(word);
+    EXPECT_EQ(Join(t.items), items) << word;
+    EXPECT_EQ(t.single ? t.singlePath + "#" + t.singleAnchor : "", single) << word;
+  }
+  EXPECT_TRUE(messages.Contains("Keyword target too long"));
+  KeywordListReset();
+  std::copy(saved.begin(), saved.end(), DocumentTable);
+  DocumentCount = savedCount;
+}
+
+TEST(LocateWordIndexTest, UpdateFirstThenDocumentationNoLongPaths) {
+  TempDir tree;
+  // Roots whose Update/command.Index path is 255 and 256 bytes long.
+  const std::string d255(255 - tree.path().size() - 1 - 21, 'd'), d256 = d255 + "d";
+  // what, TEXMF below the temporary directory, places of files, the place found, message
+  const std::tuple<const char*, std::string, std::vector<std::string>, const char*, const char*>
+      rows[] = {
+          {"both: the update files win", "a", {"Update", "doc/latex"}, "Update", ""},
+          {"only in the documentation", "b", {"doc/latex"}, "doc/latex", ""},
+          {"nowhere", "c", {}, nullptr, "Document Word Index File: NOT FOUND"},
+          {"path of 255 bytes", d255, {"Update"}, "Update", ""},
+          {"path of 256 bytes", d256, {"Update"}, nullptr, "ERROR: Word Index file path too long"},
+      };
+  for (const auto& [what, root, places, place, message] : rows) {
+    const std::string texmf = tree / root;
+    for (const std::string& p : places) tree.Write(root + "/" + p + "/command.Index", "");
+    ScopedEnv env("TEXMF", texmf), texdir("TEXDIR", std::nullopt);
+    MessageCapture messages;
+    WordIndexPath.clear();
+    const std::string found = LocateWordIndex();
+    EXPECT_EQ(found, place ? texmf + "/" + place + "/command.Index" : "") << what;
+    EXPECT_TRUE(messages.Contains(place ? "Document Word Index File: " + found : message)) << what;
+  }
+}
+
+TEST(WordIndexFuzzReplay, EveryCorpusFileRunsCleanly) {
+  MessageCapture quiet;
+  int files = 0, opened = 0;
+  for (const auto& entry : std::filesystem::directory_iterator(DOCUVANE_FUZZ_CORPUS "/wordindex")) {
+    const Bytes bytes = ReadFile(entry.path());
+    SCOPED_TRACE(entry.path().filename().string());
+    FuzzWordIndexInput(bytes.data(), bytes.size());
+    opened += OpenWordIndexFromMemory(bytes.data(), bytes.size(), "replay");
+    ++files;
+  }
+  CloseWordIndex();
+  EXPECT_GE(files, 8);
+  EXPECT_GE(opened, 8);  // the seed files made by docuvane-mkindex
 }
 
 }  // namespace
