@@ -11,14 +11,10 @@
 
 namespace testing_support {
 
-class FakeAccessServices : public AccessServices {
- public:
+struct FakeAccessServices : AccessServices {
   struct DownloadCall {
-    std::string message;
-    std::string url;
-    std::string path;
+    std::string message, url, path;
   };
-
   long Execute(const std::vector<std::string>& argv) override {
     executed.push_back(argv);
     return onExecute ? onExecute(argv) : executeResult;
@@ -35,16 +31,15 @@ class FakeAccessServices : public AccessServices {
     findExecutable.push_back(path);
     return reader;
   }
-  int Download(const std::string& message, const std::string& url, const std::string& path) override {
+  int Download(const std::string& message, const std::string& url,
+               const std::string& path) override {
     downloads.push_back({message, url, path});
     return onDownload ? onDownload(downloads.back()) : 0;
   }
   void ShowError(const std::string& message, const std::string& caption) override {
     errors.emplace_back(message, caption);
   }
-
-  // Nothing at all reached the desktop.
-  bool Untouched() const {
+  bool Untouched() const {  // nothing at all reached the desktop
     return executed.empty() && defaultApplication.empty() && browser.empty() && downloads.empty() &&
            errors.empty();
   }
@@ -52,16 +47,12 @@ class FakeAccessServices : public AccessServices {
   // Answers.
   long executeResult = 4242;
   std::function<long(const std::vector<std::string>&)> onExecute;
-  bool defaultApplicationResult = true;
-  bool browserResult = true;
+  bool defaultApplicationResult = true, browserResult = true;
   std::string reader;  // what FindExecutable gives
   std::function<int(const DownloadCall&)> onDownload;
-
   // Records.
   std::vector<std::vector<std::string>> executed;
-  std::vector<std::string> defaultApplication;
-  std::vector<std::string> browser;
-  std::vector<std::string> findExecutable;
+  std::vector<std::string> defaultApplication, browser, findExecutable;
   std::vector<DownloadCall> downloads;
   std::vector<std::pair<std::string, std::string>> errors;
 };
