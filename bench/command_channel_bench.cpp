@@ -74,7 +74,8 @@ void BM_ForwardedCommand(benchmark::State& state) {
       while ((arrived < 0 || ended < 0) && Clock::now() - start < std::chrono::seconds(20)) {
         const double now = std::chrono::duration<double, std::milli>(Clock::now() - start).count();
         // The later start's first trace: the toolkit is up, our own code begins.
-        if (started < 0 && std::filesystem::exists(later.log) && std::filesystem::file_size(later.log) > 0)
+        if (started < 0 && std::filesystem::exists(later.log) &&
+            std::filesystem::file_size(later.log) > 0)
           started = now;
         if (arrived < 0) {
           seen += ReadFrom(first.log, &offset);

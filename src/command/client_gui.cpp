@@ -6,7 +6,6 @@
 #include <sys/stat.h>
 #include <sys/un.h>
 #include <unistd.h>
-
 #include <wx/log.h>
 
 #include <atomic>
@@ -204,10 +203,9 @@ int SendCommand(const char* command, const std::string& socketPath) {
   client->m_commandConnection = Connect(*client, socketPath, watchdog);
   wxLog::EnableLogging(logging);
 
-  const wxString status =
-      wxString::Format(L"Client host=\"%s\" port=\"%s\" topic=\"%s\" %s", kHost, kCommandService,
-                       kCommandTopic,
-                       client->m_commandConnection != nullptr ? "connected" : "failed to connect");
+  const wxString status = wxString::Format(
+      L"Client host=\"%s\" port=\"%s\" topic=\"%s\" %s", kHost, kCommandService, kCommandTopic,
+      client->m_commandConnection != nullptr ? "connected" : "failed to connect");
   Message("INFO: Connection ", status.utf8_str().data());
   if (client->m_commandConnection == nullptr) return 0;
 

@@ -7,7 +7,6 @@
 #include <sys/stat.h>
 #include <sys/un.h>
 #include <unistd.h>
-
 #include <wx/app.h>
 #include <wx/datetime.h>
 #include <wx/eventfilter.h>
@@ -104,14 +103,15 @@ bool OpeningMessageArrives(int fd) {
 bool AdmitConnection(int fd) {
   uid_t uid = 0;
   if (!PeerIsThisUser(fd, &uid)) {
-    Message("ERROR: DDE server ", "connection of another user (uid " + std::to_string(uid) +
-                                      ") refused", 5);
+    Message("ERROR: DDE server ",
+            "connection of another user (uid " + std::to_string(uid) + ") refused", 5);
     return false;
   }
   if (!OpeningMessageArrives(fd)) {
-    Message("WARNING: DDE server ", "client sent no request within " +
-                                        std::to_string(kHandshakeMilliseconds) +
-                                        " ms, connection closed", 4);
+    Message("WARNING: DDE server ",
+            "client sent no request within " + std::to_string(kHandshakeMilliseconds) +
+                " ms, connection closed",
+            4);
     return false;
   }
   return true;
@@ -126,8 +126,7 @@ bool AdmitConnection(int fd) {
 // byte of them; everything else passes through unchanged.
 extern "C" int accept(int fd, sockaddr* address, socklen_t* length) {
   using AcceptFunction = int (*)(int, sockaddr*, socklen_t*);
-  static const AcceptFunction real =
-      reinterpret_cast<AcceptFunction>(dlsym(RTLD_NEXT, "accept"));
+  static const AcceptFunction real = reinterpret_cast<AcceptFunction>(dlsym(RTLD_NEXT, "accept"));
   if (real == nullptr) {
     errno = ENOSYS;
     return -1;
@@ -273,9 +272,10 @@ bool MyServer::Create(const wxString& socketPath) {
     return false;
   }
   if (path.size() > kMaxSocketPath) {
-    Message("ERROR: DDE server ", "socket path of " + std::to_string(path.size()) +
-                                      " bytes is too long (at most " +
-                                      std::to_string(kMaxSocketPath) + "): " + path, 5);
+    Message("ERROR: DDE server ",
+            "socket path of " + std::to_string(path.size()) + " bytes is too long (at most " +
+                std::to_string(kMaxSocketPath) + "): " + path,
+            5);
     return false;
   }
   if (!wxServer::Create(socketPath)) return false;

@@ -18,7 +18,7 @@ int IgnoreXError(Display*, XErrorEvent*) { return 0; }
 // three or four calls in a row, and each new connection costs a round of
 // authentication.  It stays open until the process ends.
 Display* SharedDisplay() {
-  static Display* display = [] () -> Display* {
+  static Display* display = []() -> Display* {
     const char* name = std::getenv("DISPLAY");
     if (name == nullptr || *name == '\0') return nullptr;
     return XOpenDisplay(nullptr);

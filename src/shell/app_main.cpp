@@ -2,7 +2,6 @@
 // a later start hands its command line to it and ends.
 #include <dlfcn.h>
 #include <unistd.h>
-
 #include <wx/app.h>
 #include <wx/config.h>
 #include <wx/image.h>
@@ -77,10 +76,9 @@ class MyApp : public wxApp {
   wxDECLARE_EVENT_TABLE();
 };
 
-wxBEGIN_EVENT_TABLE(MyApp, wxApp)
-wxEND_EVENT_TABLE()
+wxBEGIN_EVENT_TABLE(MyApp, wxApp) wxEND_EVENT_TABLE()
 
-wxIMPLEMENT_APP_NO_MAIN(MyApp);
+    wxIMPLEMENT_APP_NO_MAIN(MyApp);
 
 bool MyApp::OnInit() {
   Phase("Start");

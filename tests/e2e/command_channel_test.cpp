@@ -1,9 +1,8 @@
 // The command channel between a running instance and later starts.
 #include <grp.h>
+#include <gtest/gtest.h>
 
 #include <map>
-
-#include <gtest/gtest.h>
 
 #include "e2e_support.h"
 #include "platform/instance_lock.h"
@@ -32,11 +31,13 @@ TEST(CommandChannel, ServerMessagesOfOneForwardedCommandInOrder) {
   Process first = box.StartInstance();
   Process second = box.Run({"\\section"});
   ASSERT_EQ(second.status, 255);
-  ASSERT_TRUE(WaitFor([&] { return HasLineStarting(first.Log(), "INFO: DDE server OnDisconnect()"); }));
+  ASSERT_TRUE(
+      WaitFor([&] { return HasLineStarting(first.Log(), "INFO: DDE server OnDisconnect()"); }));
   const auto log = first.Log();
-  EXPECT_TRUE(InOrder(log, {"INFO: DDE server OnAcceptConnection CommandLine",
-                            "INFO: DDE server Connection accepted", "INFO: DDE server Execute \\section",
-                            "Docuvane: Search Keyword: \\section", "INFO: DDE server OnDisconnect()"}))
+  EXPECT_TRUE(
+      InOrder(log, {"INFO: DDE server OnAcceptConnection CommandLine",
+                    "INFO: DDE server Connection accepted", "INFO: DDE server Execute \\section",
+                    "Docuvane: Search Keyword: \\section", "INFO: DDE server OnDisconnect()"}))
       << Describe(log);
   for (const auto& l : log)
     if (l.text.compare(0, 16, "INFO: DDE server") == 0) {
@@ -58,7 +59,8 @@ TEST(CommandChannel, HostileCommandsAreCarriedWithoutHarm) {
       {"empty", {""}, ""},
       {"only a question mark", {"?"}, "?"},
       {"quotes and blanks", {"say \"hi\" there"}, "\"say \"hi\" there\""},
-      {"shell characters", {"$(touch " + marker + ");`touch " + marker + "`"},
+      {"shell characters",
+       {"$(touch " + marker + ");`touch " + marker + "`"},
        "\"$(touch " + marker + ");`touch " + marker + "`\""},
       {"10,000 characters arrive cut to 1023", {std::string(10000, 'z')}, std::string(1023, 'z')},
       {"a topic in lower case with marks", {"?#.lmr.nothing"}, "?#.lmr.nothing"},
@@ -74,7 +76,8 @@ TEST(CommandChannel, HostileCommandsAreCarriedWithoutHarm) {
   Process odd = box.Run({"\xff\xfe\x80 bad"});
   EXPECT_EQ(odd.status, 255);
   Process after = box.Run({"after-odd"});
-  EXPECT_TRUE(WaitFor([&] { return Executed(first.Log())["after-odd"] == 1; })) << Describe(first.Log());
+  EXPECT_TRUE(WaitFor([&] { return Executed(first.Log())["after-odd"] == 1; }))
+      << Describe(first.Log());
   EXPECT_TRUE(first.Running());
   EXPECT_FALSE(std::filesystem::exists(marker)) << "a command must never reach a shell";
   first.Stop();
@@ -87,7 +90,8 @@ TEST(CommandChannel, HundredLaterStartsInARowEachProcessedOnce) {
     Process later = box.Run({Word(i)});
     ASSERT_EQ(later.status, 255) << Word(i) << Describe(later.Log());
   }
-  ASSERT_TRUE(WaitFor([&] { return Executed(first.Log()).size() == 100; })) << Describe(first.Log());
+  ASSERT_TRUE(WaitFor([&] { return Executed(first.Log()).size() == 100; }))
+      << Describe(first.Log());
   const auto seen = Executed(first.Log());
   for (int i = 0; i < 100; ++i) EXPECT_EQ(seen.count(Word(i)) ? seen.at(Word(i)) : 0, 1) << Word(i);
   EXPECT_TRUE(first.Running());
@@ -99,7 +103,8 @@ TEST(CommandChannel, FiftyLaterStartsAtOnceEachProcessedOnce) {
   Process first = box.StartInstance();
   std::vector<Process> later;
   for (int i = 0; i < 50; ++i) later.push_back(box.Start({Word(i)}));
-  for (auto& p : later) EXPECT_EQ(p.Wait(std::chrono::milliseconds(60000)), 255) << Describe(p.Log());
+  for (auto& p : later)
+    EXPECT_EQ(p.Wait(std::chrono::milliseconds(60000)), 255) << Describe(p.Log());
   ASSERT_TRUE(WaitFor([&] { return Executed(first.Log()).size() == 50; })) << Describe(first.Log());
   const auto seen = Executed(first.Log());
   for (int i = 0; i < 50; ++i) EXPECT_EQ(seen.count(Word(i)) ? seen.at(Word(i)) : 0, 1) << Word(i);
@@ -130,7 +135,8 @@ TEST(CommandChannel, TenColdStartsGiveOneInstanceAndNineForwardedCommands) {
   }
   ASSERT_GE(survivor, 0) << "no instance runs";
   Process& instance = starts[static_cast<std::size_t>(survivor)];
-  ASSERT_TRUE(WaitFor([&] { return Executed(instance.Log()).size() == 9; })) << Describe(instance.Log());
+  ASSERT_TRUE(WaitFor([&] { return Executed(instance.Log()).size() == 9; }))
+      << Describe(instance.Log());
   const auto seen = Executed(instance.Log());
   for (int i = 0; i < 10; ++i)
     if (i != survivor) {
@@ -152,12 +158,10 @@ TEST(CommandChannel, RequestItemsAdviseAndPoke) {
     std::string item;
     bool answered;
   };
-  const Row rows[] = {{"date and time", "Date", true},
-                      {"time, blank, date with its length", "Date+len", true},
-                      {"three bytes", "bytes[3]", true},
-                      {"Date with other text", "Date+x", false},
-                      {"case counts", "date", false},
-                      {"unknown", "nothing", false}};
+  const Row rows[] = {
+      {"date and time", "Date", true},   {"time, blank, date with its length", "Date+len", true},
+      {"three bytes", "bytes[3]", true}, {"Date with other text", "Date+x", false},
+      {"case counts", "date", false},    {"unknown", "nothing", false}};
   std::map<std::string, std::string> replies;
   for (const Row& row : rows) {
     std::string reply;
@@ -196,7 +200,8 @@ TEST(CommandChannel, RequestItemsAdviseAndPoke) {
   channel.Flush();
   channel.Disconnect();
 
-  ASSERT_TRUE(WaitFor([&] { return HasLineStarting(first.Log(), "INFO: DDE server OnDisconnect()"); }));
+  ASSERT_TRUE(
+      WaitFor([&] { return HasLineStarting(first.Log(), "INFO: DDE server OnDisconnect()"); }));
   const auto log = first.Log();
   EXPECT_EQ(CountLines(log, "INFO: DDE server OnRequest..."), 3) << Describe(log);
   for (const char* item : {"Date+x", "date", "nothing"}) {
@@ -207,8 +212,9 @@ TEST(CommandChannel, RequestItemsAdviseAndPoke) {
         EXPECT_EQ(l.level, 2);
       }
   }
-  EXPECT_TRUE(InOrder(log, {"INFO: DDE server OnStartAdvise Loop", "INFO: DDE server OnStopAdvise Loop",
-                            "INFO: DDE server OnPoke...", "INFO: DDE server OnDisconnect()"}))
+  EXPECT_TRUE(
+      InOrder(log, {"INFO: DDE server OnStartAdvise Loop", "INFO: DDE server OnStopAdvise Loop",
+                    "INFO: DDE server OnPoke...", "INFO: DDE server OnDisconnect()"}))
       << Describe(log);
   EXPECT_TRUE(first.Running());
   first.Stop();
@@ -246,7 +252,8 @@ TEST(CommandChannel, SilentClientHoldsTheWindowOnlyBriefly) {
   EXPECT_EQ(later.status, 255);
   ASSERT_TRUE(WaitFor([&] { return Executed(first.Log())["after-silence"] == 1; }));
   EXPECT_LT(Clock::now() - sent, std::chrono::milliseconds(6000));
-  EXPECT_TRUE(HasLineStarting(first.Log(), "WARNING: DDE server client sent no request")) << Describe(first.Log());
+  EXPECT_TRUE(HasLineStarting(first.Log(), "WARNING: DDE server client sent no request"))
+      << Describe(first.Log());
   // The silent client's connection has been closed by the server.
   EXPECT_EQ(silent.ReadByte(), -1);
   first.Stop();
@@ -275,10 +282,12 @@ TEST(CommandChannel, RecoveryAfterTheInstanceIsKilled) {
     }
     Process next = box.StartInstance({"again"});
     ASSERT_TRUE(next.Running()) << row.what;
-    EXPECT_EQ(CountLines(next.Log(), "INFO: DDE server started Lomari.DDE.Docuvane"), 1) << row.what;
+    EXPECT_EQ(CountLines(next.Log(), "INFO: DDE server started Lomari.DDE.Docuvane"), 1)
+        << row.what;
     Process later = box.Run({"served"});
     EXPECT_EQ(later.status, 255) << row.what;
-    EXPECT_TRUE(WaitFor([&] { return Executed(next.Log())["served"] == 1; })) << row.what << Describe(next.Log());
+    EXPECT_TRUE(WaitFor([&] { return Executed(next.Log())["served"] == 1; }))
+        << row.what << Describe(next.Log());
     next.Stop();
   }
 }
@@ -317,8 +326,10 @@ TEST(CommandChannel, LaterStartNeverHangsOnAStuckInstance) {
     EXPECT_EQ(later.status, 255) << row.what;
     EXPECT_LT(took, std::chrono::milliseconds(15000)) << row.what;
     const auto own = later.Log();
-    EXPECT_TRUE(HasLineStarting(own, "INFO: Connection Client host=\"localhost\"")) << Describe(own);
-    EXPECT_EQ(own.back().text.find("failed to connect") != std::string::npos, true) << Describe(own);
+    EXPECT_TRUE(HasLineStarting(own, "INFO: Connection Client host=\"localhost\""))
+        << Describe(own);
+    EXPECT_EQ(own.back().text.find("failed to connect") != std::string::npos, true)
+        << Describe(own);
     if (row.error) {
       EXPECT_EQ(CountLines(own, row.error), 1) << Describe(own);
     }
@@ -381,7 +392,8 @@ TEST(CommandChannel, OtherUsersAreRefused) {
   EXPECT_EQ(error, 0);
   EXPECT_FALSE(answered);
   ASSERT_TRUE(WaitFor([&] {
-    return HasLineStarting(first.Log(), "ERROR: DDE server connection of another user (uid 65534) refused");
+    return HasLineStarting(first.Log(),
+                           "ERROR: DDE server connection of another user (uid 65534) refused");
   })) << Describe(first.Log());
 
   // The owner is still served (once the runtime directory is private

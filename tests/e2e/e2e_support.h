@@ -99,8 +99,8 @@ inline void EnsureDisplay() {
   int pipeFds[2];
   if (pipe(pipeFds) != 0) return;
   const std::string fdText = std::to_string(pipeFds[1]);
-  std::vector<std::string> args = {"Xvfb", "-displayfd", fdText, "-screen", "0", "1600x1200x24",
-                                   "-nolisten", "tcp", "-noreset"};
+  std::vector<std::string> args = {"Xvfb",         "-displayfd", fdText, "-screen", "0",
+                                   "1600x1200x24", "-nolisten",  "tcp",  "-noreset"};
   std::vector<char*> argv;
   for (auto& a : args) argv.push_back(a.data());
   argv.push_back(nullptr);
@@ -142,7 +142,8 @@ struct Process {
     int raw = 0;
     const pid_t r = waitpid(pid, &raw, WNOHANG);
     if (r == 0) return true;
-    if (r == pid) status = WIFEXITED(raw) ? WEXITSTATUS(raw) : WIFSIGNALED(raw) ? 128 + WTERMSIG(raw) : -1;
+    if (r == pid)
+      status = WIFEXITED(raw) ? WEXITSTATUS(raw) : WIFSIGNALED(raw) ? 128 + WTERMSIG(raw) : -1;
     pid = -1;
     return false;
   }
@@ -248,7 +249,9 @@ class Sandbox {
   // Starts the first instance and waits until it serves commands.
   Process StartInstance(const std::vector<std::string>& args = {}) {
     Process p = Start(args);
-    WaitFor([&] { return HasLineStarting(p.Log(), "Docuvane: Docuvane::OnInit --- Parse_Command_Line"); });
+    WaitFor([&] {
+      return HasLineStarting(p.Log(), "Docuvane: Docuvane::OnInit --- Parse_Command_Line");
+    });
     return p;
   }
 
@@ -258,7 +261,6 @@ class Sandbox {
     p.Wait(limit);
     return p;
   }
-
 
  private:
   testing_support::TempDir dir_;
@@ -272,8 +274,15 @@ class Sandbox {
 class RawChannel {
  public:
   enum Code : unsigned char {
-    kExecute = 1, kRequest = 2, kPoke = 3, kAdviseStart = 4, kAdviseStop = 7,
-    kRequestReply = 8, kFail = 9, kConnect = 10, kDisconnect = 11,
+    kExecute = 1,
+    kRequest = 2,
+    kPoke = 3,
+    kAdviseStart = 4,
+    kAdviseStop = 7,
+    kRequestReply = 8,
+    kFail = 9,
+    kConnect = 10,
+    kDisconnect = 11,
   };
   static constexpr unsigned char kText = 1;
 
@@ -307,7 +316,8 @@ class RawChannel {
   }
   void Raw(const std::string& bytes) { out_ += bytes; }
   bool Flush() {
-    const bool ok = send(fd_, out_.data(), out_.size(), MSG_NOSIGNAL) == static_cast<ssize_t>(out_.size());
+    const bool ok =
+        send(fd_, out_.data(), out_.size(), MSG_NOSIGNAL) == static_cast<ssize_t>(out_.size());
     out_.clear();
     return ok;
   }

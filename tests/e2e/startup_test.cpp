@@ -9,9 +9,9 @@ namespace {
 using namespace e2e;
 
 const std::vector<std::string> kPhases = {
-    "Docuvane: Docuvane::OnInit --- Start",        "Docuvane: Docuvane::OnInit --- Names",
-    "Docuvane: Docuvane::OnInit --- pConfig",      "Docuvane: Docuvane::OnInit --- Command_Line",
-    "Docuvane: Docuvane::OnInit --- Frame ...",    "Docuvane: Docuvane::OnInit --- Parse_Command_Line",
+    "Docuvane: Docuvane::OnInit --- Start",     "Docuvane: Docuvane::OnInit --- Names",
+    "Docuvane: Docuvane::OnInit --- pConfig",   "Docuvane: Docuvane::OnInit --- Command_Line",
+    "Docuvane: Docuvane::OnInit --- Frame ...", "Docuvane: Docuvane::OnInit --- Parse_Command_Line",
 };
 
 TEST(Startup, PhasesInOrderAndTheCommandLineLookedUp) {
@@ -20,11 +20,12 @@ TEST(Startup, PhasesInOrderAndTheCommandLineLookedUp) {
   ASSERT_TRUE(first.Running());
   const auto log = first.Log();
   EXPECT_TRUE(InOrder(log, kPhases)) << Describe(log);
-  EXPECT_TRUE(InOrder(log, {"Docuvane: Docuvane::OnInit --- Command_Line", "INFO: Command_Line - \\section",
-                            "Docuvane: Docuvane::OnInit --- Frame ...",
-                            "INFO: DDE server started Lomari.DDE.Docuvane", "INFO: DDE server uses DDE",
-                            "Docuvane: Docuvane::OnInit --- Parse_Command_Line",
-                            "Docuvane: Search Keyword: \\section"}))
+  EXPECT_TRUE(InOrder(
+      log,
+      {"Docuvane: Docuvane::OnInit --- Command_Line", "INFO: Command_Line - \\section",
+       "Docuvane: Docuvane::OnInit --- Frame ...", "INFO: DDE server started Lomari.DDE.Docuvane",
+       "INFO: DDE server uses DDE", "Docuvane: Docuvane::OnInit --- Parse_Command_Line",
+       "Docuvane: Search Keyword: \\section"}))
       << Describe(log);
   // Each phase once: nothing ran twice.
   for (const auto& phase : kPhases) EXPECT_EQ(CountLines(log, phase), 1) << phase;
@@ -49,15 +50,17 @@ TEST(Startup, SecondStartForwardsAndEndsWithoutWindow) {
   EXPECT_FALSE(HasLineStarting(own, "Docuvane: Docuvane::OnInit --- Names")) << Describe(own);
   EXPECT_FALSE(HasLineStarting(own, "Docuvane: Docuvane::OnInit --- Frame")) << Describe(own);
   EXPECT_FALSE(HasLineStarting(own, "Docuvane: Docuvane_Init")) << Describe(own);
-  EXPECT_TRUE(InOrder(own, {"Docuvane: Docuvane::OnInit --- Start", "INFO: Command_Line - {align}",
-                            "INFO: SendCommand {align}", "INFO: DDE client is connecting...",
-                            "INFO: Connection Client host=\"localhost\" port=\"Lomari.DDE.Docuvane\" "
-                            "topic=\"CommandLine\" connected",
-                            "INFO: DDE client Execute...", "INFO: DDE client disconnected from server"}))
+  EXPECT_TRUE(
+      InOrder(own, {"Docuvane: Docuvane::OnInit --- Start", "INFO: Command_Line - {align}",
+                    "INFO: SendCommand {align}", "INFO: DDE client is connecting...",
+                    "INFO: Connection Client host=\"localhost\" port=\"Lomari.DDE.Docuvane\" "
+                    "topic=\"CommandLine\" connected",
+                    "INFO: DDE client Execute...", "INFO: DDE client disconnected from server"}))
       << Describe(own);
 
-  ASSERT_TRUE(WaitFor([&] { return CountLines(first.Log(), "Docuvane: Search Keyword: {align}") == 1; }))
-      << Describe(first.Log());
+  ASSERT_TRUE(WaitFor([&] {
+    return CountLines(first.Log(), "Docuvane: Search Keyword: {align}") == 1;
+  })) << Describe(first.Log());
   EXPECT_TRUE(first.Running()) << "the first instance runs on";
   first.Stop();
 }
@@ -129,7 +132,8 @@ TEST(Startup, ServerFailureLeavesTheProgramRunning) {
   ASSERT_TRUE(first.Running());
   const auto log = first.Log();
   EXPECT_TRUE(HasLineStarting(log, "ERROR: DDE server socket path of ")) << Describe(log);
-  EXPECT_EQ(CountLines(log, "ERROR: DDE server failed to start Lomari.DDE.Docuvane"), 1) << Describe(log);
+  EXPECT_EQ(CountLines(log, "ERROR: DDE server failed to start Lomari.DDE.Docuvane"), 1)
+      << Describe(log);
   EXPECT_FALSE(std::filesystem::exists(box.socketPath()));
   // No abstract socket bound in its place either.
   std::ifstream unix("/proc/net/unix");
@@ -140,9 +144,10 @@ TEST(Startup, ServerFailureLeavesTheProgramRunning) {
   Process second = box.Run({"x"});
   EXPECT_EQ(second.status, 255);
   const auto own = second.Log();
-  EXPECT_TRUE(InOrder(own, {"INFO: SendCommand x", "INFO: DDE client is connecting...",
-                            "INFO: Connection Client host=\"localhost\" port=\"Lomari.DDE.Docuvane\" "
-                            "topic=\"CommandLine\" failed to connect"}))
+  EXPECT_TRUE(
+      InOrder(own, {"INFO: SendCommand x", "INFO: DDE client is connecting...",
+                    "INFO: Connection Client host=\"localhost\" port=\"Lomari.DDE.Docuvane\" "
+                    "topic=\"CommandLine\" failed to connect"}))
       << Describe(own);
   EXPECT_TRUE(first.Running());
   first.Stop();

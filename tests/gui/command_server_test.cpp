@@ -1,11 +1,11 @@
 // The command server inside a running event loop, and the framework's log
 // target and traits.
+#include <gtest/gtest.h>
 #include <sys/socket.h>
 #include <sys/stat.h>
 #include <sys/un.h>
 #include <sys/wait.h>
 #include <unistd.h>
-
 #include <wx/app.h>
 #include <wx/dialog.h>
 #include <wx/timer.h>
@@ -17,8 +17,6 @@
 #include <memory>
 #include <string>
 #include <vector>
-
-#include <gtest/gtest.h>
 
 #include "command/server_gui.h"
 #include "shell/log_gui.h"
@@ -174,15 +172,18 @@ TEST_F(CommandServerTest, SocketPathRules) {
   const Row rows[] = {
       {"a name without '/' would be a TCP port", "Lomari.DDE.Docuvane", false},
       {"107 bytes is the longest path", base + std::string(107 - base.size(), 's'), true},
-      {"108 bytes would become an abstract socket", base + std::string(108 - base.size(), 't'), false},
+      {"108 bytes would become an abstract socket", base + std::string(108 - base.size(), 't'),
+       false},
       {"an empty path (runtime directory refused)", "", false},
   };
   for (const Row& row : rows) {
     MessageCapture capture;
     std::unique_ptr<MyServer> server(StartCommandServer(row.path));
     EXPECT_EQ(server != nullptr, row.starts) << row.what;
-    EXPECT_EQ(capture.Contains("INFO: DDE server started Lomari.DDE.Docuvane"), row.starts) << row.what;
-    EXPECT_EQ(capture.LevelOf("ERROR: DDE server failed to start Lomari.DDE.Docuvane"), row.starts ? -1 : 5)
+    EXPECT_EQ(capture.Contains("INFO: DDE server started Lomari.DDE.Docuvane"), row.starts)
+        << row.what;
+    EXPECT_EQ(capture.LevelOf("ERROR: DDE server failed to start Lomari.DDE.Docuvane"),
+              row.starts ? -1 : 5)
         << row.what;
     if (row.starts) {
       struct stat st;

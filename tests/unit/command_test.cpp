@@ -1,13 +1,14 @@
 // The command line and the command grammar.
+#include "command/command.h"
+
+#include <gtest/gtest.h>
+
 #include <clocale>
 #include <string>
 #include <vector>
 
-#include <gtest/gtest.h>
-
 #include "catalogue/documents.h"
 #include "catalogue/keywords.h"
-#include "command/command.h"
 #include "shell/settings.h"
 #include "test_support.h"
 
@@ -185,7 +186,9 @@ TEST_F(ProcessCommandTest, GrammarTable) {
       {"only a question mark searches the empty text",
        "?",
        {"search:", "find:/1", "select:0", "show:\\Section/1"}},
-      {"a question mark and hash mark alone", "?#", {"search:", "find:/1", "select:0", "show:\\Section/1"}},
+      {"a question mark and hash mark alone",
+       "?#",
+       {"search:", "find:/1", "select:0", "show:\\Section/1"}},
       {"empty command does nothing", "", {}},
       {"quotes stay part of the body",
        "\"b c\"",
@@ -196,7 +199,8 @@ TEST_F(ProcessCommandTest, GrammarTable) {
       {"invalid UTF-8 passes as bytes",
        "\xff\xfe\x80",
        {"search:\xff\xfe\x80", "find:\xff\xfe\x80/1", "show:\xff\xfe\x80/1"}},
-      {"10,000 characters", longWord,
+      {"10,000 characters",
+       longWord,
        {"search:" + longWord, "find:" + longWord + "/1", "show:" + longWord + "/1"}},
   };
   for (const Row& row : rows) {

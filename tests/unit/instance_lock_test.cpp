@@ -2,12 +2,11 @@
 #include "platform/instance_lock.h"
 
 #include <fcntl.h>
+#include <gtest/gtest.h>
 #include <signal.h>
 #include <sys/stat.h>
 #include <sys/wait.h>
 #include <unistd.h>
-
-#include <gtest/gtest.h>
 
 #include "test_support.h"
 
@@ -136,7 +135,8 @@ TEST(InstanceLock, UnusableLockPlaceLetsTheProgramStart) {
     MessageCapture capture;
     InstanceLock lock;
     if (row.symlink) {
-      ASSERT_EQ(symlink((dir / "elsewhere").c_str(), (dir / (std::string(kName) + ".lock")).c_str()), 0);
+      ASSERT_EQ(
+          symlink((dir / "elsewhere").c_str(), (dir / (std::string(kName) + ".lock")).c_str()), 0);
       EXPECT_FALSE(lock.Create(kName, dir.path())) << row.what;
     } else {
       ScopedEnv runtime("XDG_RUNTIME_DIR", dir.path());
