@@ -1,13 +1,13 @@
-// The lookup driven as a user drives it: typing selects a word and fills the
-// Locations list, a location is shown in the tree and opened, a tree item is
-// opened; the buttons reach the handlers they belong to.
+// The lookup driven as a user drives it: typing fills the Locations list, a
+// location is shown in the tree and opened, so is a tree item; the buttons
+// reach the window that handles them.
 #include <gtest/gtest.h>
 #include <wx/button.h>
-#include <wx/dialog.h>
 #include <wx/listbox.h>
 #include <wx/srchctrl.h>
 #include <wx/timer.h>
 #include <wx/treectrl.h>
+#include <wx/uiaction.h>
 
 #include "gui_support.h"
 #include "window/about.h"
@@ -23,328 +23,210 @@ class LookupTest : public WindowTest {
 
   void SetUp() override {
     WindowTest::SetUp();
-    tree.BuildAll();
+    if (HasFatalFailure()) return;
     OpenFrame();
     frame->Raise();
+  }
+
+  // Clicks a point of `window` (client coordinates; by default its middle).
+  void Click(wxWindow* window, wxPoint at = wxDefaultPosition, bool twice = false) {
+    if (at == wxDefaultPosition)
+      at = wxPoint(window->GetClientSize().x / 2, window->GetClientSize().y / 2);
+    sim.MouseMove(window->ClientToScreen(at));
+    Flush();
+    twice ? sim.MouseDblClick() : sim.MouseClick();
     Flush();
   }
 
-  void ClickAt(const wxPoint& screen, bool twice = false) {
-    sim.MouseMove(screen);
-    Flush();
-    if (twice) sim.MouseDblClick();
-    else sim.MouseClick();
-    Flush();
+  void ClickLocation(int row, bool twice = false) {
+    wxListBox* list = panel()->m_targetList;
+    for (int y = 1; y < list->GetClientSize().y; ++y)
+      if (list->HitTest(wxPoint(20, y)) == row) return Click(list, wxPoint(20, y + 3), twice);
+    ADD_FAILURE() << "row " << row << " is not visible";
   }
 
-  void Click(wxWindow* window, bool twice = false) {
-    const wxSize size = window->GetSize();
-    ClickAt(window->GetScreenPosition() + wxPoint(size.x / 2, size.y / 2), twice);
+  void DoubleClickItem(const wxString& text) {
+    panel()->m_tree->EnsureVisible(Item(text));
+    Flush();
+    wxRect rect;
+    ASSERT_TRUE(panel()->m_tree->GetBoundingRect(Item(text), rect, true)) << text;
+    Click(panel()->m_tree, rect.GetPosition() + rect.GetSize() / 2, true);
   }
 
-  void Type(const char* text) {
+  void TypeSection() {
     Click(panel()->m_search);
-    ASSERT_TRUE(sim.Text(text));
-    Flush();
+    ASSERT_TRUE(sim.Text("\\sec"));
+    ASSERT_TRUE(WaitFor([&] { return panel()->m_targetList->GetCount() == 4; }));
+  }
+
+  std::string Word() {
+    return panel()->m_wordList->GetString(panel()->m_wordList->GetSelection()).utf8_string();
   }
 
   std::vector<std::string> Locations() {
     std::vector<std::string> items;
-    for (unsigned i = 0; i < panel()->m_targetList->GetCount(); ++i)
-      items.push_back(panel()->m_targetList->GetString(i).utf8_string());
+    for (const wxString& s : panel()->m_targetList->GetStrings()) items.push_back(s.utf8_string());
     return items;
   }
 
-  // Clicks row `row` of the Locations list.
-  void ClickLocation(int row, bool twice = false) {
-    wxListBox* list = panel()->m_targetList;
-    for (int y = 1; y < list->GetClientSize().y; ++y) {
-      if (list->HitTest(wxPoint(20, y)) == row) {
-        ClickAt(list->ClientToScreen(wxPoint(20, y + 3)), twice);
-        return;
-      }
-    }
-    ADD_FAILURE() << "row " << row << " is not visible";
-  }
-
-  wxTreeItemId FindItem(const wxTreeItemId& parent, const wxString& text) {
+  wxTreeItemId Item(const wxString& text, wxTreeItemId parent = wxTreeItemId()) {
     wxTreeCtrl* t = panel()->m_tree;
     wxTreeItemIdValue cookie;
-    for (wxTreeItemId child = t->GetFirstChild(parent, cookie); child.IsOk();
-         child = t->GetNextChild(parent, cookie)) {
+    for (wxTreeItemId child = t->GetFirstChild(parent.IsOk() ? parent : t->GetRootItem(), cookie);
+         child.IsOk(); child = t->GetNextSibling(child)) {
       if (t->GetItemText(child) == text) return child;
-      const wxTreeItemId below = FindItem(child, text);
-      if (below.IsOk()) return below;
+      if (const wxTreeItemId below = Item(text, child); below.IsOk()) return below;
     }
     return wxTreeItemId();
   }
 
-  std::string Doc(const std::string& rel) const { return tree.texmf + "/doc/" + rel; }
-
-  // Waits for the n-th start of `program` and returns its arguments.
-  std::vector<std::string> WaitForRun(const std::string& program, size_t n = 1) {
-    WaitFor([&] { return tree.Records(program).size() >= n; });
-    auto runs = tree.Records(program);
-    if (runs.size() != n) {
-      ADD_FAILURE() << program << " started " << runs.size() << " times, expected " << n;
-      return {};
+  // Waits for recorded starts and returns them (program name, then arguments); forgets them.
+  std::vector<Args> Runs() {
+    WaitFor([&] { return !std::filesystem::is_empty(records); });
+    Flush();
+    std::vector<Args> runs;
+    for (const auto& entry : std::filesystem::directory_iterator(records)) {
+      std::ifstream in(entry.path());
+      runs.emplace_back();
+      for (std::string line; std::getline(in, line);) runs.back().push_back(line);
+      std::filesystem::remove(entry.path());
     }
-    tree.ClearRecords();
-    return runs[0];
+    return runs;
+  }
+
+  // What a start of the viewer on `doc` (under doc/) with these further arguments records.
+  std::vector<Args> Viewer(const std::string& doc, Args more = {}) {
+    more.insert(more.begin(), {"docuvane-test-viewer", texmf + "/doc/" + doc});
+    return {more};
   }
 };
 
 TEST_F(LookupTest, TypingSelectsTheWordAndFillsLocations) {
   Docuvane* p = panel();
-  MessageCapture messages;
-  Type("\\sec");
-  ASSERT_TRUE(WaitFor([&] { return p->m_search->GetValue() == "\\sec"; })) << p->m_search->GetValue();
-  ASSERT_TRUE(WaitFor([&] { return p->m_targetList->GetCount() == 4; }));
-
-  EXPECT_EQ(p->m_wordList->GetString(p->m_wordList->GetSelection()), "\\section");
+  TypeSection();
+  EXPECT_EQ(Word(), "\\section");
   // Keyword targets first, newest first, then the index pages.
-  const std::string guide = Doc("latex/guide/guide.pdf");
-  EXPECT_EQ(Locations(), (std::vector<std::string>{guide + "#sec:headings", guide + "#sec:section",
-                                                   "latex/base/sample.pdf#page=12 15 ",
-                                                   "fonts/fontguide.pdf#page=3 "}));
+  const std::string guide = texmf + "/doc/latex/guide/guide.pdf";
+  const std::vector<std::string> section{guide + "#sec:headings", guide + "#sec:section",
+                                         "latex/base/sample.pdf#page=12 15 ",
+                                         "fonts/fontguide.pdf#page=3 "};
+  EXPECT_EQ(Locations(), section);
   EXPECT_EQ(p->m_targetList->GetSelection(), 0);
   EXPECT_FALSE(p->m_gotoButton->IsEnabled()) << "row 0 is selected by the program, not the user";
-  EXPECT_EQ(messages.LevelOf("INFO: Docuvane::Show_Topic \\section"), 3);
-  EXPECT_EQ(messages.LevelOf("INFO: Docuvane::OnSearch of \\sec"), 3);
 
-  // A text no word starts with keeps the word and its locations.
-  ASSERT_TRUE(sim.Text("x"));
-  ASSERT_TRUE(WaitFor([&] { return p->m_search->GetValue() == "\\secx"; }));
-  Flush();
-  EXPECT_EQ(p->m_wordList->GetString(p->m_wordList->GetSelection()), "\\section");
-  EXPECT_EQ(p->m_targetList->GetCount(), 4u);
+  const struct {
+    const char *what, *text, *word;
+    std::vector<std::string> locations;
+  } rows[] = {
+      {"a text no word starts with keeps the word", "\\secx", "\\section", section},
+      {"an empty field keeps the word", "", "\\section", section},
+      {"a leading backslash or brace is skipped", "al", "{align}", {"math/amsldoc.pdf#page=7 "}},
+  };
+  for (const auto& row : rows) {
+    SCOPED_TRACE(row.what);
+    p->m_search->SetValue(row.text);
+    Flush();
+    EXPECT_EQ(Word(), row.word);
+    EXPECT_EQ(Locations(), row.locations);
+  }
 
-  // Clearing the field keeps the word and its locations.
-  p->m_search->SetValue("");
-  Flush();
-  EXPECT_EQ(p->m_wordList->GetString(p->m_wordList->GetSelection()), "\\section");
-  EXPECT_EQ(p->m_targetList->GetCount(), 4u);
-
-  // Without the backslash the prefix search ignores it and the brace.
-  p->m_search->SetValue("al");
-  Flush();
-  EXPECT_EQ(p->m_wordList->GetString(p->m_wordList->GetSelection()), "{align}");
-  EXPECT_EQ(Locations(), std::vector<std::string>{"math/amsldoc.pdf#page=7 "});
+  // Clicking a word shows its locations too (rows have one height).
+  QListBox* words = p->m_wordList;
+  Click(words, wxPoint(30, words->RowHeight * 3 / 2));  // row 1: \alpha
+  ASSERT_TRUE(WaitFor([&] { return words->GetSelection() == 1; }));
+  EXPECT_EQ(Locations(), std::vector<std::string>{"math/amsldoc.pdf#page=2 "});
 }
 
-TEST_F(LookupTest, ClickingAWordShowsItsLocations) {
+TEST_F(LookupTest, ALocationIsBoldedInTheTreeAndOpensThroughTheTemplate) {
   Docuvane* p = panel();
-  QListBox* words = p->m_wordList;
-  MessageCapture messages;
-  // Row 1 is \alpha; rows have one height and the list starts at row 0.
-  const int row = 1;
-  ClickAt(words->ClientToScreen(wxPoint(30, row * words->RowHeight + words->RowHeight / 2)));
-  ASSERT_TRUE(WaitFor([&] { return words->GetSelection() == row; }));
-  ASSERT_TRUE(WaitFor([&] { return p->m_targetList->GetCount() == 1; }));
-  EXPECT_EQ(Locations(), std::vector<std::string>{"math/amsldoc.pdf#page=2 "});
-  EXPECT_EQ(messages.LevelOf("INFO: Docuvane::OnIndexChanged to \\alpha"), 3);
+  TypeSection();
+  bool frameSawGoTo = false;
+  frame->Bind(
+      wxEVT_BUTTON, [&](wxCommandEvent&) { frameSawGoTo = true; }, ID_GOTO);
+  auto select = [&](int row, const wxString& bold, const wxString& notBold) {
+    ClickLocation(row);
+    ASSERT_TRUE(WaitFor([&] { return p->m_targetList->GetSelection() == row; }));
+    EXPECT_TRUE(p->m_gotoButton->IsEnabled());
+    EXPECT_TRUE(p->m_tree->IsBold(Item(bold)));
+    EXPECT_FALSE(p->m_tree->IsBold(Item(notBold)));
+    EXPECT_EQ(p->m_tree->GetSelection(), Item(bold));
+  };
+  // An index location: its label's node; "&Go To" opens the label at the pages.
+  select(3, "fontguide.pdf", "Guide");
+  Click(p->m_gotoButton);
+  EXPECT_EQ(Runs(), Viewer("fonts/fontguide.pdf", {"page=3 "}));
+  // A keyword location: its document's node; a double-click opens it at the anchor.
+  select(1, "Guide", "fontguide.pdf");
+  ClickLocation(1, true);
+  EXPECT_EQ(Runs(), Viewer("latex/guide/guide.pdf", {"sec:section"}));
+  EXPECT_FALSE(frameSawGoTo) << "the panel handles \"&Go To\"";
+  // A new word takes the bold away and disables "&Go To" again.
+  p->m_search->SetValue("\\alpha");
+  Flush();
+  EXPECT_FALSE(p->m_tree->IsBold(Item("Guide")));
   EXPECT_FALSE(p->m_gotoButton->IsEnabled());
 }
 
-TEST_F(LookupTest, CommandsRunOnThePanel) {
+TEST_F(LookupTest, HighlightIgnoresCaseAndSurvivesARebuild) {
   Docuvane* p = panel();
-  struct Row {
-    const char* what;
-    const char* command;
-    int exact;
-    const char* word;  // selected afterwards
-    std::vector<std::string> locations;
-  };
-  const std::string guide = Doc("latex/guide/guide.pdf");
-  const Row rows[] = {
-      {"a word is searched and shown", "\\alpha", 0, "\\alpha", {"math/amsldoc.pdf#page=2 "}},
-      {"a prefix selects the first word", "\\sectionm", 0, "\\sectionmark",
-       {"latex/base/sample.pdf#page=20 "}},
-      {"an unlisted keyword keeps the word and lists its target", "\\chapter", 1, "\\sectionmark",
-       {guide + "#chap"}},
-  };
-  for (const Row& row : rows) {
-    SCOPED_TRACE(row.what);
-    ProcessCommand(p, row.command, row.exact);
-    Flush();
-    EXPECT_EQ(p->m_wordList->GetString(p->m_wordList->GetSelection()), row.word);
-    EXPECT_EQ(Locations(), row.locations);
-  }
-  // Its single target opened at once, as a command asks.
-  EXPECT_EQ(WaitForRun("docuvane-test-viewer"), (std::vector<std::string>{guide, "chap"}));
-  ProcessCommand(static_cast<Docuvane*>(nullptr), "\\alpha", 0);  // no panel: nothing to do
-}
-
-TEST_F(LookupTest, HighlightFollowsTheDocumentPartAndSurvivesARebuild) {
-  Docuvane* p = panel();
-  const wxTreeItemId sample = FindItem(p->m_tree->GetRootItem(), "sample.pdf");
-  struct Row {
-    const char* what;
-    std::string text;
-    bool bold;
-  };
-  const Row rows[] = {
-      {"a text without '#' is matched whole", "latex/base/sample.pdf", true},
-      {"case is ignored", "LATEX/Base/Sample.PDF#page=1 ", true},
-      {"a document the table does not know leaves the tree alone", "other.pdf#page=1", false},
-  };
-  for (const Row& row : rows) {
-    SCOPED_TRACE(row.what);
-    Show_Topic(p, "tabular", 0);  // clears the bold
-    HighlightDocument(p, row.text.c_str());
-    EXPECT_EQ(p->m_tree->IsBold(sample), row.bold);
-    EXPECT_EQ(HighlightedItem.IsOk(), row.bold);
-  }
-  // Rebuilding the tree deletes the bold item; the next lookup must not
-  // touch it.
-  HighlightDocument(p, "latex/base/sample.pdf");
-  ASSERT_TRUE(HighlightedItem.IsOk());
-  Fill_Tree(p);
+  HighlightDocument(p, "other.pdf#page=1");
+  EXPECT_FALSE(HighlightedItem.IsOk()) << "a document the table does not know";
+  HighlightDocument(p, "LATEX/Base/Sample.PDF");  // no '#': the whole text
+  EXPECT_TRUE(p->m_tree->IsBold(Item("sample.pdf")));
+  ASSERT_EQ(HighlightedItem, Item("sample.pdf"));
+  Fill_Tree(p);  // deletes the bold item: the next lookup must not touch it
   EXPECT_FALSE(HighlightedItem.IsOk());
   Show_Topic(p, "\\section", 0);
   EXPECT_EQ(p->m_targetList->GetCount(), 4u);
 }
 
-TEST_F(LookupTest, SelectingLocationsBoldsTheirDocumentAndEnablesGoTo) {
+TEST_F(LookupTest, TreeDoubleClickAndOpenCommandOpenTheDocument) {
   Docuvane* p = panel();
-  Type("\\section");
-  ASSERT_TRUE(WaitFor([&] { return p->m_targetList->GetCount() == 4; }));
-  const wxTreeItemId guide = FindItem(p->m_tree->GetRootItem(), "Guide");
-  const wxTreeItemId sample = FindItem(p->m_tree->GetRootItem(), "sample.pdf");
-  ASSERT_TRUE(guide.IsOk() && sample.IsOk());
-
-  struct Row {
-    const char* what;
-    int location;
-    wxTreeItemId bold, notBold;
-  };
-  const Row rows[] = {
-      {"an index location bolds its label's node", 2, sample, guide},
-      {"a keyword location moves the bold to its document", 1, guide, sample},
-  };
-  for (const Row& row : rows) {
-    SCOPED_TRACE(row.what);
-    ClickLocation(row.location);
-    ASSERT_TRUE(WaitFor([&] { return p->m_targetList->GetSelection() == row.location; }));
-    ASSERT_TRUE(WaitFor([&] { return p->m_gotoButton->IsEnabled(); }));
-    EXPECT_TRUE(p->m_tree->IsBold(row.bold));
-    EXPECT_FALSE(p->m_tree->IsBold(row.notBold));
-    EXPECT_EQ(p->m_tree->GetSelection(), row.bold);
-    EXPECT_EQ(HighlightedItem, row.bold);
-  }
-
-  // A new word takes the bold away and disables "&Go To" again.
-  p->m_search->SetValue("\\alpha");
-  Flush();
-  EXPECT_FALSE(p->m_tree->IsBold(guide));
-  EXPECT_FALSE(HighlightedItem.IsOk());
-  EXPECT_FALSE(p->m_gotoButton->IsEnabled());
-}
-
-TEST_F(LookupTest, GoToAndDoubleClickOpenTheLocationThroughTheTemplate) {
-  Docuvane* p = panel();
-  Type("\\section");
-  ASSERT_TRUE(WaitFor([&] { return p->m_targetList->GetCount() == 4; }));
-
-  // "&Go To" on an index location: the label found in the tree, the pages
-  // as the anchor.
-  ClickLocation(3);
-  ASSERT_TRUE(WaitFor([&] { return p->m_gotoButton->IsEnabled(); }));
-  bool frameSawGoTo = false;
-  frame->Bind(wxEVT_BUTTON, [&](wxCommandEvent&) { frameSawGoTo = true; }, ID_GOTO);
   MessageCapture messages;
-  Click(p->m_gotoButton);
-  EXPECT_EQ(WaitForRun("docuvane-test-viewer"),
-            (std::vector<std::string>{Doc("fonts/fontguide.pdf"), "page=3 "}));
-  EXPECT_TRUE(messages.Contains("INFO: Docuvane::OnGotoTarget fonts/fontguide.pdf#page=3 "));
-  EXPECT_FALSE(frameSawGoTo) << "the panel handles \"&Go To\"";
+  DoubleClickItem("Reference");
+  EXPECT_EQ(Runs(), Viewer("latex/reference.pdf"));
 
-  // A double-click on a keyword location opens the document at its anchor.
-  ClickLocation(1);
-  ASSERT_TRUE(WaitFor([&] { return p->m_targetList->GetSelection() == 1; }));
-  ClickLocation(1, true);
-  EXPECT_EQ(WaitForRun("docuvane-test-viewer"),
-            (std::vector<std::string>{Doc("latex/guide/guide.pdf"), "sec:section"}));
-  EXPECT_TRUE(messages.Contains("INFO: Docuvane::OnTargetActivate "));
-}
-
-TEST_F(LookupTest, DoubleClickInTheTreeOpensTheDocument) {
-  Docuvane* p = panel();
-  const wxTreeItemId reference = FindItem(p->m_tree->GetRootItem(), "Reference");
-  ASSERT_TRUE(reference.IsOk());
-  p->m_tree->EnsureVisible(reference);
-  Flush();
-  wxRect rect;
-  ASSERT_TRUE(p->m_tree->GetBoundingRect(reference, rect, true));
-  MessageCapture messages;
-  ClickAt(p->m_tree->ClientToScreen(rect.GetPosition() + wxPoint(rect.width / 2, rect.height / 2)), true);
-  const auto args = WaitForRun("docuvane-test-viewer");
-  ASSERT_FALSE(args.empty());
-  EXPECT_EQ(args[0], Doc("latex/reference.pdf"));
-  EXPECT_TRUE(messages.Contains("INFO: Docuvane::OnTreeActivate "));
-  EXPECT_TRUE(messages.Contains("Label='Manuals>LaTeX>Reference'"));
-
-  // A category opens nothing.
-  messages.clear();
-  const wxTreeItemId manuals = FindItem(p->m_tree->GetRootItem(), "Manuals");
-  ASSERT_TRUE(p->m_tree->GetBoundingRect(manuals, rect, true));
-  ClickAt(p->m_tree->ClientToScreen(rect.GetPosition() + wxPoint(rect.width / 2, rect.height / 2)), true);
+  DoubleClickItem("Manuals");  // a category opens nothing
   ASSERT_TRUE(WaitFor([&] { return messages.Contains("Not found clicked document"); }));
-  EXPECT_TRUE(tree.Records("docuvane-test-viewer").empty());
-}
+  EXPECT_TRUE(std::filesystem::is_empty(records));
 
-TEST_F(LookupTest, OpenCommandOpensTheSelectedTreeDocument) {
-  Docuvane* p = panel();
-  MessageCapture messages;
-  auto send = [&] {
-    wxCommandEvent open(wxEVT_BUTTON, ID_OPEN_DOC);
-    p->GetEventHandler()->ProcessEvent(open);
-  };
-  p->m_tree->SelectItem(FindItem(p->m_tree->GetRootItem(), "Catalogue"));
-  send();
-  const auto args = WaitForRun("docuvane-test-viewer");
-  ASSERT_FALSE(args.empty());
-  EXPECT_EQ(args[0], Doc("fonts/fontcat.pdf"));
+  p->m_tree->SelectItem(Item("Catalogue"));
+  wxCommandEvent open(wxEVT_BUTTON, ID_OPEN_DOC);
+  p->GetEventHandler()->ProcessEvent(open);
+  EXPECT_EQ(Runs(), Viewer("fonts/fontcat.pdf"));
   EXPECT_EQ(p->Open_Document(wxTreeItemId()), 0);
-  EXPECT_EQ(messages.LevelOf("ERROR: Docuvane::Open_Document invalid wxTreeItemId"), 5);
-}
-
-TEST_F(LookupTest, HelpAndInternetButtonsReachTheFrame) {
-  MessageCapture messages;
-  Click(wxWindow::FindWindowById(wxID_HELP, frame));
-  EXPECT_EQ(WaitForRun("docuvane-test-viewer"),
-            (std::vector<std::string>{Doc("docuvane/docuvane-help.pdf"), "help-start"}));
-  EXPECT_EQ(messages.LevelOf("INFO: MyFrame::OnHelp"), 2);
-
-  Click(wxWindow::FindWindowById(ID_INTERNET, frame));
-  EXPECT_EQ(WaitForRun("xdg-open"), std::vector<std::string>{"http://127.0.0.1:9/docs/about.php"});
-  EXPECT_EQ(messages.LevelOf("INFO: MyFrame::OnInternet"), 2);
 }
 
 // Ends the About dialog's modal loop from inside it, once it is up.
-class AboutCloser : public wxTimer {
- public:
+struct AboutCloser : wxTimer {
   bool shown = false;
   void Notify() override {
-    for (wxWindow* w : wxTopLevelWindows) {
-      auto* about = dynamic_cast<AboutDlg*>(w);
-      if (about && about->IsModal()) {
+    for (wxWindow* w : wxTopLevelWindows)
+      if (auto* about = dynamic_cast<AboutDlg*>(w); about && about->IsModal()) {
         shown = true;
         about->EndModal(wxID_CANCEL);
-        Stop();
       }
-    }
   }
 };
 
-TEST_F(LookupTest, AboutButtonShowsTheModalDialog) {
+TEST_F(LookupTest, HelpInternetAboutReachTheFrame) {
+  MessageCapture messages;
+  Click(wxWindow::FindWindowById(wxID_HELP, frame));
+  EXPECT_EQ(Runs(), Viewer("docuvane/docuvane-help.pdf", {"help-start"}));
+  EXPECT_TRUE(messages.Contains("INFO: MyFrame::OnHelp"));
+
+  Click(wxWindow::FindWindowById(ID_INTERNET, frame));
+  EXPECT_EQ(Runs(), (std::vector<Args>{{"xdg-open", "http://127.0.0.1:9/docs/about.php"}}));
+  EXPECT_TRUE(messages.Contains("INFO: MyFrame::OnInternet"));
+
   AboutCloser closer;
   closer.Start(50);
   Click(wxWindow::FindWindowById(wxID_ABOUT, frame));
   EXPECT_TRUE(WaitFor([&] { return closer.shown; }));
   closer.Stop();
   Flush();
-  for (wxWindow* w : wxTopLevelWindows) EXPECT_EQ(dynamic_cast<AboutDlg*>(w), nullptr) << "destroyed";
+  for (wxWindow* w : wxTopLevelWindows)
+    EXPECT_EQ(dynamic_cast<AboutDlg*>(w), nullptr) << "destroyed";
 }
 
 }  // namespace
