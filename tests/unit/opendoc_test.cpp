@@ -91,23 +91,17 @@ TEST(OpenDocPaths, IsAbsolutePath) {
 TEST(OpenDocPaths, CheckLoadedPdf) {
   TempDir dir;
   const std::string padding(2000, 'x');
-  struct Row {
-    const char* what;
-    std::string content;
-    bool complete;
-  } rows[] = {
-      {"complete small file", kCompletePdf, true},
-      {"startxref in the last 1024 bytes", "%PDF-1.7\n" + padding + "startxref\n12\n%%EOF", true},
-      {"startxref ending exactly at the end", "%PDF-1.5 startxref", true},
-      {"startxref only before the last 1024", "%PDF-1.7\nstartxref\n" + padding, false},
-      {"startxref across the 1024 boundary",
-       "%PDF-1.7\nstartx" + std::string("ref") + std::string(1021, 'y'), false},
-      {"wrong magic", "%PDF-2.0 startxref", false},
-      {"html page", "<html>startxref</html>", false},
-      {"shorter than nine bytes", "%PDF-1.4", false},
+  auto check = [&](const std::string& content) {
+    return Check_Loaded_PDF(dir.Write("f.pdf", content).c_str());
   };
-  for (const Row& row : rows)
-    EXPECT_EQ(Check_Loaded_PDF(dir.Write("f.pdf", row.content).c_str()), row.complete) << row.what;
+  EXPECT_TRUE(check(kCompletePdf));
+  EXPECT_TRUE(check("%PDF-1.7\n" + padding + "startxref\n12\n%%EOF")) << "in the last 1024";
+  EXPECT_TRUE(check("%PDF-1.5 startxref")) << "ending exactly at the end";
+  EXPECT_FALSE(check("%PDF-1.7\nstartxref\n" + padding)) << "only before the last 1024";
+  EXPECT_FALSE(check("%PDF-1.7\nstartxref" + std::string(1021, 'y'))) << "across the boundary";
+  EXPECT_FALSE(check("%PDF-2.0 startxref")) << "wrong magic";
+  EXPECT_FALSE(check("<html>startxref</html>"));
+  EXPECT_FALSE(check("%PDF-1.4")) << "shorter than nine bytes";
   EXPECT_FALSE(Check_Loaded_PDF((dir / "missing.pdf").c_str()));
   EXPECT_FALSE(Check_Loaded_PDF(dir.path().c_str())) << "a directory";
   EXPECT_FALSE(Check_Loaded_PDF(nullptr));

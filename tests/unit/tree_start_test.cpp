@@ -4,9 +4,9 @@
 #include <sys/stat.h>
 
 #include <chrono>
-#include <memory>
 #include <optional>
 #include <string>
+#include <utility>
 #include <vector>
 
 #include "access/opendoc.h"
