@@ -20,6 +20,9 @@ DOCUVANE_PRIVATE_DISPLAY=1
 export DOCUVANE_PRIVATE_DISPLAY
 export DISPLAY
 unset WAYLAND_DISPLAY
+# No accessibility bus: nothing listens on it here, and GTK would try to reach it.
+NO_AT_BRIDGE=1
+export NO_AT_BRIDGE
 "$@"
 status=$?
 kill "$xvfb_pid" 2>/dev/null
