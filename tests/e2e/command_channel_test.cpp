@@ -11,207 +11,154 @@ namespace {
 
 using namespace e2e;
 
-std::string Word(int i) {
-  char buf[16];
-  std::snprintf(buf, sizeof buf, "w%04d", i);
-  return buf;
-}
+std::string Word(const char* tag, int i) { return tag + std::to_string(1000 + i); }
 
-// How often each word reached the instance's command processing.
-std::map<std::string, int> Executed(const std::vector<LogLine>& log) {
+// How often each command reached the instance's command processing.
+std::map<std::string, int> Executed(const Process& p) {
   std::map<std::string, int> seen;
   const std::string prefix = "INFO: DDE server Execute ";
-  for (const auto& l : log)
+  for (const auto& l : p.Lines())
     if (l.text.compare(0, prefix.size(), prefix) == 0) ++seen[l.text.substr(prefix.size())];
   return seen;
 }
 
-TEST(CommandChannel, ServerMessagesOfOneForwardedCommandInOrder) {
-  Sandbox box;
-  Process first = box.StartInstance();
-  Process second = box.Run({"\\section"});
-  ASSERT_EQ(second.status, 255);
-  ASSERT_TRUE(
-      WaitFor([&] { return HasLineStarting(first.Log(), "INFO: DDE server OnDisconnect()"); }));
-  const auto log = first.Log();
-  EXPECT_TRUE(
-      InOrder(log, {"INFO: DDE server OnAcceptConnection CommandLine",
-                    "INFO: DDE server Connection accepted", "INFO: DDE server Execute \\section",
-                    "Docuvane: Search Keyword: \\section", "INFO: DDE server OnDisconnect()"}))
-      << Describe(log);
-  for (const auto& l : log)
-    if (l.text.compare(0, 16, "INFO: DDE server") == 0) {
-      EXPECT_EQ(l.level, 2) << l.text;
-    }
-  first.Stop();
+// Every word of `words` executed exactly once.
+void ExpectEachOnce(const Process& p, const std::vector<std::string>& words) {
+  std::map<std::string, int> seen;
+  ASSERT_TRUE(WaitFor([&] {
+    seen = Executed(p);
+    for (const auto& w : words)
+      if (!seen.count(w)) return false;
+    return true;
+  })) << Describe(p.Lines());
+  for (const auto& w : words) EXPECT_EQ(seen[w], 1) << w;
 }
 
-TEST(CommandChannel, HostileCommandsAreCarriedWithoutHarm) {
+TEST(CommandChannel, HostileSilentAndManyLaterStartsEachProcessedOnce) {
   Sandbox box;
   Process first = box.StartInstance();
   const std::string marker = box.root() + "/shell-ran";
+  const std::string shell = "$(touch " + marker + ");`touch " + marker + "`";
   struct Row {
     const char* what;
-    std::vector<std::string> args;
-    std::string arrives;  // the text the server executes
+    std::string arg, arrives;
   };
   const std::vector<Row> rows = {
-      {"empty", {""}, ""},
-      {"only a question mark", {"?"}, "?"},
-      {"quotes and blanks", {"say \"hi\" there"}, "\"say \"hi\" there\""},
-      {"shell characters",
-       {"$(touch " + marker + ");`touch " + marker + "`"},
-       "\"$(touch " + marker + ");`touch " + marker + "`\""},
-      {"10,000 characters arrive cut to 1023", {std::string(10000, 'z')}, std::string(1023, 'z')},
-      {"a topic in lower case with marks", {"?#.lmr.nothing"}, "?#.lmr.nothing"},
+      {"only a question mark", "?", "?"},
+      {"quotes and blanks", "say \"hi\" there", "\"say \"hi\" there\""},
+      {"shell characters", shell, "\"" + shell + "\""},
+      {"10,000 characters arrive cut to 1023", std::string(10000, 'z'), std::string(1023, 'z')},
+      {"invalid UTF-8, then the next command still served", "\xff\xfe\x80 bad", ""},
   };
   for (const Row& row : rows) {
-    Process later = box.Run(row.args);
-    EXPECT_EQ(later.status, 255) << row.what;
-    EXPECT_TRUE(WaitFor([&] { return Executed(first.Log())[row.arrives] >= 1; })) << row.what;
+    EXPECT_EQ(box.Run({row.arg}).status, 255) << row.what;
+    if (row.arrives.empty()) {
+      EXPECT_EQ(box.Run({"after-odd"}).status, 255);
+    }
+    ExpectEachOnce(first, {row.arrives.empty() ? "after-odd" : row.arrives});
     ASSERT_TRUE(first.Running()) << row.what;
   }
-  // Invalid UTF-8 cannot become a wide argument; whatever arrives, the
-  // instance stays up and answers the next command.
-  Process odd = box.Run({"\xff\xfe\x80 bad"});
-  EXPECT_EQ(odd.status, 255);
-  Process after = box.Run({"after-odd"});
-  EXPECT_TRUE(WaitFor([&] { return Executed(first.Log())["after-odd"] == 1; }))
-      << Describe(first.Log());
-  EXPECT_TRUE(first.Running());
   EXPECT_FALSE(std::filesystem::exists(marker)) << "a command must never reach a shell";
-  first.Stop();
-}
 
-TEST(CommandChannel, HundredLaterStartsInARowEachProcessedOnce) {
-  Sandbox box;
-  Process first = box.StartInstance();
+  // A client that connects and says nothing holds the window only briefly.
+  RawChannel silent;
+  ASSERT_EQ(silent.Connect(box.socketPath()), 0);
+  const auto sent = Clock::now();
+  EXPECT_EQ(box.Run({"after-silence"}).status, 255);
+  ExpectEachOnce(first, {"after-silence"});
+  EXPECT_LT(Clock::now() - sent, milliseconds(6000));
+  EXPECT_TRUE(HasPrefix(first.Lines(), "WARNING: DDE server client sent no request"));
+  EXPECT_EQ(silent.ReadByte(), -1) << "the server closed the silent connection";
+
+  std::vector<std::string> words;
   for (int i = 0; i < 100; ++i) {
-    Process later = box.Run({Word(i)});
-    ASSERT_EQ(later.status, 255) << Word(i) << Describe(later.Log());
+    words.push_back(Word("row", i));
+    ASSERT_EQ(box.Run({words.back()}).status, 255) << words.back();
   }
-  ASSERT_TRUE(WaitFor([&] { return Executed(first.Log()).size() == 100; }))
-      << Describe(first.Log());
-  const auto seen = Executed(first.Log());
-  for (int i = 0; i < 100; ++i) EXPECT_EQ(seen.count(Word(i)) ? seen.at(Word(i)) : 0, 1) << Word(i);
-  EXPECT_TRUE(first.Running());
-  first.Stop();
-}
+  ExpectEachOnce(first, words);
 
-TEST(CommandChannel, FiftyLaterStartsAtOnceEachProcessedOnce) {
-  Sandbox box;
-  Process first = box.StartInstance();
+  words.clear();
   std::vector<Process> later;
-  for (int i = 0; i < 50; ++i) later.push_back(box.Start({Word(i)}));
-  for (auto& p : later)
-    EXPECT_EQ(p.Wait(std::chrono::milliseconds(60000)), 255) << Describe(p.Log());
-  ASSERT_TRUE(WaitFor([&] { return Executed(first.Log()).size() == 50; })) << Describe(first.Log());
-  const auto seen = Executed(first.Log());
-  for (int i = 0; i < 50; ++i) EXPECT_EQ(seen.count(Word(i)) ? seen.at(Word(i)) : 0, 1) << Word(i);
-  EXPECT_EQ(CountLines(first.Log(), "INFO: DDE server OnDisconnect()"), 50);
+  for (int i = 0; i < 50; ++i) {
+    words.push_back(Word("once", i));
+    later.push_back(box.Start({words.back()}));
+  }
+  for (auto& p : later) EXPECT_EQ(p.Wait(milliseconds(60000)), 255) << Describe(p.Lines());
+  ExpectEachOnce(first, words);
+  EXPECT_TRUE(first.Running());
   first.Stop();
 }
 
 TEST(CommandChannel, TenColdStartsGiveOneInstanceAndNineForwardedCommands) {
   Sandbox box;
   std::vector<Process> starts;
-  for (int i = 0; i < 10; ++i) starts.push_back(box.Start({Word(i)}));
-  // Nine end; one stays.
-  ASSERT_TRUE(WaitFor(
-      [&] {
-        int running = 0;
-        for (auto& p : starts) running += p.Running() ? 1 : 0;
-        return running <= 1;
-      },
-      std::chrono::milliseconds(60000)));
-  int survivor = -1;
+  for (int i = 0; i < 10; ++i) starts.push_back(box.Start({Word("cold", i)}));
+  const auto running = [&] {
+    int n = 0;
+    for (auto& p : starts) n += p.Running();
+    return n;
+  };
+  ASSERT_TRUE(WaitFor([&] { return running() <= 1; }, milliseconds(60000)));
+  ASSERT_EQ(running(), 1);
+  std::vector<std::string> forwarded;
+  Process* instance = nullptr;
   for (int i = 0; i < 10; ++i) {
     if (starts[i].Running()) {
-      EXPECT_EQ(survivor, -1) << "two instances run";
-      survivor = i;
-    } else {
-      EXPECT_EQ(starts[i].status, 255) << Word(i) << Describe(starts[i].Log());
+      instance = &starts[i];
+      continue;
     }
+    EXPECT_EQ(starts[i].status, 255) << Describe(starts[i].Lines());
+    forwarded.push_back(Word("cold", i));
   }
-  ASSERT_GE(survivor, 0) << "no instance runs";
-  Process& instance = starts[static_cast<std::size_t>(survivor)];
-  ASSERT_TRUE(WaitFor([&] { return Executed(instance.Log()).size() == 9; }))
-      << Describe(instance.Log());
-  const auto seen = Executed(instance.Log());
-  for (int i = 0; i < 10; ++i)
-    if (i != survivor) {
-      EXPECT_EQ(seen.count(Word(i)) ? seen.at(Word(i)) : 0, 1) << Word(i);
-    }
-  EXPECT_EQ(CountLines(instance.Log(), "Docuvane: Search Keyword: " + Word(survivor)), 1);
-  instance.Stop();
+  ExpectEachOnce(*instance, forwarded);
+  EXPECT_EQ(Executed(*instance).size(), 9u);
+  instance->Stop();
 }
 
-TEST(CommandChannel, RequestItemsAdviseAndPoke) {
+TEST(CommandChannel, RequestItemsAdvisePokeAndForeignTopics) {
   Sandbox box;
   Process first = box.StartInstance();
+  for (const std::string topic : {"Other", "commandline", "CommandLine ", ""}) {
+    RawChannel refused;
+    ASSERT_EQ(refused.Connect(box.socketPath()), 0);
+    EXPECT_EQ(refused.Open(topic), RawChannel::kFail) << topic;
+  }
   RawChannel channel;
-  ASSERT_TRUE(channel.Connect(box.socketPath()));
+  ASSERT_EQ(channel.Connect(box.socketPath()), 0);
   ASSERT_EQ(channel.Open("CommandLine"), RawChannel::kConnect);
-
-  struct Row {
-    const char* what;
-    std::string item;
-    bool answered;
-  };
-  const Row rows[] = {
-      {"date and time", "Date", true},   {"time, blank, date with its length", "Date+len", true},
-      {"three bytes", "bytes[3]", true}, {"Date with other text", "Date+x", false},
-      {"case counts", "date", false},    {"unknown", "nothing", false}};
+  const int reply = RawChannel::kRequestReply, fail = RawChannel::kFail;
   std::map<std::string, std::string> replies;
-  for (const Row& row : rows) {
-    std::string reply;
-    int code = 0;
-    EXPECT_EQ(channel.Request(row.item, &reply, &code), row.answered) << row.what;
-    EXPECT_EQ(code, row.answered ? RawChannel::kRequestReply : RawChannel::kFail) << row.what;
-    replies[row.item] = reply;
+  for (const auto& [item, code] : std::vector<std::pair<std::string, int>>{{"Date", reply},
+                                                                           {"Date+len", reply},
+                                                                           {"bytes[3]", reply},
+                                                                           {"Date+x", fail},
+                                                                           {"date", fail},
+                                                                           {"nothing", fail}})
+    EXPECT_EQ(channel.Request(item, &replies[item]), code) << item;
+  // Both dates: text with its NUL counted; "Date+len" has the time first.
+  for (const std::string& date : {replies["Date"], replies["Date+len"]}) {
+    ASSERT_GT(date.size(), 1u);
+    EXPECT_EQ(std::strlen(date.c_str()) + 1, date.size()) << date;
   }
-  // "Date": the text measured by the transport, its NUL included.
-  ASSERT_FALSE(replies["Date"].empty());
-  EXPECT_EQ(replies["Date"].back(), '\0');
-  EXPECT_EQ(std::strlen(replies["Date"].c_str()) + 1, replies["Date"].size());
-  // "Date+len": time, one blank, date; the size counts the NUL.
-  const std::string withLength = replies["Date+len"];
-  ASSERT_FALSE(withLength.empty());
-  EXPECT_EQ(withLength.back(), '\0');
-  EXPECT_EQ(std::strlen(withLength.c_str()) + 1, withLength.size());
-  EXPECT_NE(withLength.find(':'), std::string::npos) << withLength;
-  EXPECT_LT(withLength.find(':'), withLength.find(' ')) << "time first: " << withLength;
+  const std::string& withLength = replies["Date+len"];
+  EXPECT_LT(withLength.find(':'), withLength.find(' ')) << withLength;
   EXPECT_EQ(replies["bytes[3]"], "123");
-
-  // Advise loops are recorded; pokes are refused without an answer.
-  channel.Byte(RawChannel::kAdviseStart);
-  channel.String("Loop");
-  channel.Flush();
+  channel.Send(RawChannel::kAdviseStart, RawChannel::Text("Loop"));
   EXPECT_EQ(channel.ReadByte(), RawChannel::kAdviseStart);
-  channel.Byte(RawChannel::kAdviseStop);
-  channel.String("Loop");
-  channel.Flush();
+  channel.Send(RawChannel::kAdviseStop, RawChannel::Text("Loop"));
   EXPECT_EQ(channel.ReadByte(), RawChannel::kAdviseStop);
-  channel.Byte(RawChannel::kPoke);
-  channel.String("Item");
-  channel.Byte(RawChannel::kText);
-  channel.Length(2);
-  channel.Raw(std::string("x", 2));
-  channel.Flush();
-  channel.Disconnect();
+  channel.Send(RawChannel::kPoke,
+               RawChannel::Text("Item") + '\1' + RawChannel::Text(std::string("x", 2)));
+  channel.Send(RawChannel::kDisconnect, "");
 
-  ASSERT_TRUE(
-      WaitFor([&] { return HasLineStarting(first.Log(), "INFO: DDE server OnDisconnect()"); }));
-  const auto log = first.Log();
-  EXPECT_EQ(CountLines(log, "INFO: DDE server OnRequest..."), 3) << Describe(log);
-  for (const char* item : {"Date+x", "date", "nothing"}) {
-    const std::string line = std::string("ERROR: DDE server Unknown requestOnExecute ") + item;
-    EXPECT_EQ(CountLines(log, line), 1) << line;
-    for (const auto& l : log)
-      if (l.text == line) {
-        EXPECT_EQ(l.level, 2);
-      }
-  }
+  ASSERT_TRUE(WaitFor([&] { return HasPrefix(first.Lines(), "INFO: DDE server OnDisconnect()"); }));
+  const Log log = first.Lines();
+  EXPECT_EQ(Count(log, "ERROR: DDE server Unknown topic, connection refused", 5), 4)
+      << Describe(log);
+  EXPECT_EQ(Count(log, "INFO: DDE server Connection accepted"), 1);
+  EXPECT_EQ(Count(log, "INFO: DDE server OnRequest..."), 3) << Describe(log);
+  for (const char* item : {"Date+x", "date", "nothing"})
+    EXPECT_EQ(Count(log, std::string("ERROR: DDE server Unknown requestOnExecute ") + item, 2), 1);
   EXPECT_TRUE(
       InOrder(log, {"INFO: DDE server OnStartAdvise Loop", "INFO: DDE server OnStopAdvise Loop",
                     "INFO: DDE server OnPoke...", "INFO: DDE server OnDisconnect()"}))
@@ -220,189 +167,98 @@ TEST(CommandChannel, RequestItemsAdviseAndPoke) {
   first.Stop();
 }
 
-TEST(CommandChannel, OnlyTheCommandLineTopicIsAccepted) {
-  Sandbox box;
-  Process first = box.StartInstance();
-  for (const std::string topic : {"Other", "commandline", "CommandLine ", ""}) {
-    RawChannel channel;
-    ASSERT_TRUE(channel.Connect(box.socketPath()));
-    EXPECT_EQ(channel.Open(topic), RawChannel::kFail) << topic;
-    const std::string line = "INFO: DDE server OnAcceptConnection " + topic;
-    ASSERT_TRUE(WaitFor([&] { return CountLines(first.Log(), line) == 1; })) << topic;
-  }
-  const auto log = first.Log();
-  int refusals = 0;
-  for (const auto& l : log)
-    if (l.text == "ERROR: DDE server Unknown topic, connection refused") {
-      ++refusals;
-      EXPECT_EQ(l.level, 5);
-    }
-  EXPECT_EQ(refusals, 4);
-  EXPECT_EQ(CountLines(log, "INFO: DDE server Connection accepted"), 0);
-  first.Stop();
-}
-
-TEST(CommandChannel, SilentClientHoldsTheWindowOnlyBriefly) {
-  Sandbox box;
-  Process first = box.StartInstance();
-  RawChannel silent;
-  ASSERT_TRUE(silent.Connect(box.socketPath()));
-  const auto sent = Clock::now();
-  Process later = box.Run({"after-silence"});
-  EXPECT_EQ(later.status, 255);
-  ASSERT_TRUE(WaitFor([&] { return Executed(first.Log())["after-silence"] == 1; }));
-  EXPECT_LT(Clock::now() - sent, std::chrono::milliseconds(6000));
-  EXPECT_TRUE(HasLineStarting(first.Log(), "WARNING: DDE server client sent no request"))
-      << Describe(first.Log());
-  // The silent client's connection has been closed by the server.
-  EXPECT_EQ(silent.ReadByte(), -1);
-  first.Stop();
-}
-
 TEST(CommandChannel, RecoveryAfterTheInstanceIsKilled) {
-  struct Row {
-    const char* what;
-    std::function<std::string(Sandbox&)> lockContent;  // NULL: leave the file as it is
-  };
-  const std::vector<Row> rows = {
+  const std::vector<std::pair<const char*, const char*>> rows = {
       {"stale socket, lock file as left", nullptr},
-      {"empty lock file", [](Sandbox&) { return std::string(); }},
-      {"lock file naming a live process of this user",
-       [](Sandbox&) { return std::to_string(getpid()) + "\n"; }},
-  };
-  for (const Row& row : rows) {
+      {"empty lock file", ""},
+      {"lock file naming a live process of this user", "self"}};
+  for (const auto& [what, lockContent] : rows) {
     Sandbox box;
     Process killed = box.StartInstance();
-    ASSERT_TRUE(killed.Running()) << row.what;
+    ASSERT_TRUE(killed.Running()) << what;
     killed.Kill(SIGKILL);
     ASSERT_TRUE(std::filesystem::exists(box.socketPath())) << "a killed instance leaves its socket";
-    if (row.lockContent) {
-      std::ofstream lock(box.lockPath(), std::ios::trunc);
-      lock << row.lockContent(box);
-    }
+    if (lockContent)
+      std::ofstream(box.lockPath(), std::ios::trunc)
+          << (*lockContent ? std::to_string(getpid()) + "\n" : "");
     Process next = box.StartInstance({"again"});
-    ASSERT_TRUE(next.Running()) << row.what;
-    EXPECT_EQ(CountLines(next.Log(), "INFO: DDE server started Lomari.DDE.Docuvane"), 1)
-        << row.what;
-    Process later = box.Run({"served"});
-    EXPECT_EQ(later.status, 255) << row.what;
-    EXPECT_TRUE(WaitFor([&] { return Executed(next.Log())["served"] == 1; }))
-        << row.what << Describe(next.Log());
+    ASSERT_TRUE(next.Running()) << what;
+    EXPECT_EQ(Count(next.Lines(), "INFO: DDE server started Lomari.DDE.Docuvane"), 1) << what;
+    EXPECT_EQ(box.Run({"served"}).status, 255) << what;
+    ExpectEachOnce(next, {"served"});
     next.Stop();
   }
 }
 
 TEST(CommandChannel, LaterStartNeverHangsOnAStuckInstance) {
-  struct Row {
-    const char* what;
-    bool listening;  // a socket that takes connections but never answers
-    const char* error;
-  };
-  const Row rows[] = {
-      {"an instance that holds the lock and never answers", true,
-       "ERROR: DDE client no answer from the server"},
-      {"an instance that holds the lock but has no socket", false, nullptr},
-  };
-  for (const Row& row : rows) {
+  for (const bool listening : {true, false}) {
+    // Stand in for a running instance: hold its lock, and a socket that
+    // takes connections but never answers (or none).
     Sandbox box;
-    // Stand in for a running instance: hold its lock (and its socket).
     std::filesystem::create_directories(box.runtimeDir());
     chmod(box.runtimeDir().c_str(), 0700);
     InstanceLock lock;
-    const std::string lockFile = std::filesystem::path(box.lockPath()).filename().string();
-    ASSERT_TRUE(lock.Create(lockFile.substr(0, lockFile.size() - 5), box.runtimeDir())) << row.what;
-    int listener = -1;
-    if (row.listening) {
-      listener = socket(AF_UNIX, SOCK_STREAM, 0);
-      sockaddr_un address{};
-      address.sun_family = AF_UNIX;
-      std::strncpy(address.sun_path, box.socketPath().c_str(), sizeof address.sun_path - 1);
-      ASSERT_EQ(bind(listener, reinterpret_cast<sockaddr*>(&address), sizeof address), 0);
+    ASSERT_TRUE(lock.Create(box.lockName(), box.runtimeDir()));
+    const int listener = socket(AF_UNIX, SOCK_STREAM, 0);
+    const sockaddr_un address = UnixAddress(box.socketPath());
+    if (listening) {
+      ASSERT_EQ(bind(listener, reinterpret_cast<const sockaddr*>(&address), sizeof address), 0);
       ASSERT_EQ(listen(listener, 5), 0);
     }
     const auto start = Clock::now();
-    Process later = box.Run({"lost"}, std::chrono::milliseconds(30000));
-    const auto took = Clock::now() - start;
-    EXPECT_EQ(later.status, 255) << row.what;
-    EXPECT_LT(took, std::chrono::milliseconds(15000)) << row.what;
-    const auto own = later.Log();
-    EXPECT_TRUE(HasLineStarting(own, "INFO: Connection Client host=\"localhost\""))
+    Process later = box.Run({"lost"}, milliseconds(30000));
+    EXPECT_EQ(later.status, 255) << listening;
+    EXPECT_LT(Clock::now() - start, milliseconds(15000)) << listening;
+    const Log own = later.Lines();
+    ASSERT_FALSE(own.empty());
+    EXPECT_NE(own.back().text.find("failed to connect"), std::string::npos) << Describe(own);
+    EXPECT_EQ(Count(own, "ERROR: DDE client no answer from the server"), listening ? 1 : 0)
         << Describe(own);
-    EXPECT_EQ(own.back().text.find("failed to connect") != std::string::npos, true)
-        << Describe(own);
-    if (row.error) {
-      EXPECT_EQ(CountLines(own, row.error), 1) << Describe(own);
-    }
-    if (listener >= 0) close(listener);
+    close(listener);
   }
 }
 
-// Connects as the user `nobody` and tries to run a command.
-void ConnectAsNobody(const std::string& socketPath, int* connectError, bool* answered) {
-  int report[2];
-  ASSERT_EQ(pipe(report), 0);
+// Connects as the user `nobody` and tries to run a command: the error of
+// connect(), 100 when the conversation was accepted, else 0.
+int ConnectAsNobody(const std::string& socketPath) {
   const pid_t child = fork();
   if (child == 0) {
-    close(report[0]);
-    int result[2] = {0, 0};
-    if (setgroups(0, nullptr) != 0 || setgid(65534) != 0 || setuid(65534) != 0) _exit(3);
+    if (setgroups(0, nullptr) != 0 || setgid(65534) != 0 || setuid(65534) != 0) _exit(200);
     RawChannel channel;
-    if (!channel.Connect(socketPath)) {
-      result[0] = channel.error();
-    } else {
-      const int code = channel.Open("CommandLine");
-      result[1] = code == RawChannel::kConnect ? 1 : 0;
-      channel.Execute("intruder");
-    }
-    if (write(report[1], result, sizeof result) != sizeof result) _exit(4);
-    _exit(0);
+    if (const int error = channel.Connect(socketPath)) _exit(error);
+    const bool accepted = channel.Open("CommandLine") == RawChannel::kConnect;
+    channel.Send(RawChannel::kExecute, '\1' + RawChannel::Text(std::string("intruder", 9)));
+    _exit(accepted ? 100 : 0);
   }
-  close(report[1]);
-  int result[2] = {-1, -1};
-  const ssize_t got = read(report[0], result, sizeof result);
-  close(report[0]);
   int status = 0;
   waitpid(child, &status, 0);
-  ASSERT_EQ(got, static_cast<ssize_t>(sizeof result));
-  *connectError = result[0];
-  *answered = result[1] == 1;
+  return WIFEXITED(status) ? WEXITSTATUS(status) : -1;
 }
 
 TEST(CommandChannel, OtherUsersAreRefused) {
   if (geteuid() != 0) GTEST_SKIP() << "needs root to switch to another user";
   Sandbox box;
   Process first = box.StartInstance();
+  EXPECT_EQ(ConnectAsNobody(box.socketPath()), EACCES) << "the private directory stops them";
 
-  // As installed: the private directory stops them.
-  int error = 0;
-  bool answered = false;
-  ConnectAsNobody(box.socketPath(), &error, &answered);
-  EXPECT_EQ(error, EACCES);
-  EXPECT_FALSE(answered);
-
-  // Everything opened up: the server itself still drops the connection
-  // before reading its command.
-  for (std::string dir = box.socketPath(); dir.size() > 1;) {
-    dir = std::filesystem::path(dir).parent_path().string();
-    if (dir.size() < box.root().size()) break;
+  // Everything opened up: the server still drops the connection before
+  // reading its command.
+  for (auto dir = std::filesystem::path(box.socketPath()).parent_path();
+       dir.string().size() >= box.root().size(); dir = dir.parent_path())
     chmod(dir.c_str(), 0755);
-  }
   chmod(box.socketPath().c_str(), 0666);
-  ConnectAsNobody(box.socketPath(), &error, &answered);
-  EXPECT_EQ(error, 0);
-  EXPECT_FALSE(answered);
+  EXPECT_EQ(ConnectAsNobody(box.socketPath()), 0);
   ASSERT_TRUE(WaitFor([&] {
-    return HasLineStarting(first.Log(),
-                           "ERROR: DDE server connection of another user (uid 65534) refused");
-  })) << Describe(first.Log());
+    return HasPrefix(first.Lines(),
+                     "ERROR: DDE server connection of another user (uid 65534) refused");
+  })) << Describe(first.Lines());
 
-  // The owner is still served (once the runtime directory is private
-  // again, which a start insists on), and the intruder's command never ran.
+  // The owner is still served once the runtime directory is private again.
   chmod(box.runtimeDir().c_str(), 0700);
-  Process later = box.Run({"owner"});
-  EXPECT_TRUE(WaitFor([&] { return Executed(first.Log())["owner"] == 1; }));
-  EXPECT_EQ(Executed(first.Log()).count("intruder"), 0u);
-  EXPECT_EQ(CountLines(first.Log(), "INFO: DDE server OnAcceptConnection CommandLine"), 1)
+  EXPECT_EQ(box.Run({"owner"}).status, 255);
+  ExpectEachOnce(first, {"owner"});
+  EXPECT_EQ(Executed(first).count("intruder"), 0u);
+  EXPECT_EQ(Count(first.Lines(), "INFO: DDE server OnAcceptConnection CommandLine"), 1)
       << "only the owner's conversation";
   first.Stop();
 }

@@ -10,6 +10,7 @@
 #include <wx/dialog.h>
 #include <wx/timer.h>
 
+#include <algorithm>
 #include <cstdint>
 #include <cstring>
 #include <filesystem>
@@ -27,52 +28,31 @@ namespace {
 using testing_support::MessageCapture;
 using testing_support::TempDir;
 
-// The framework's wire bytes of one conversation that executes `command`.
-std::string Conversation(const std::string& command) {
-  std::string bytes;
-  auto length = [&](std::uint32_t n) {
-    for (int i = 0; i < 4; ++i) bytes.push_back(static_cast<char>(n >> (8 * i)));
-  };
-  bytes.push_back(10);  // connect
-  length(11);
-  bytes += "CommandLine";
-  bytes.push_back(1);  // execute
-  bytes.push_back(1);  // text
-  length(static_cast<std::uint32_t>(command.size() + 1));
-  bytes += command;
-  bytes.push_back('\0');
-  bytes.push_back(11);  // disconnect
-  return bytes;
-}
-
-// Sends a conversation from a child process, so that the server in this
-// process can answer while the child waits.  The child only makes system
-// calls.
-void SendFromChild(const std::string& socketPath, const std::string& command) {
-  const std::string bytes = Conversation(command);
+sockaddr_un Address(const std::string& path) {
   sockaddr_un address{};
   address.sun_family = AF_UNIX;
-  std::strncpy(address.sun_path, socketPath.c_str(), sizeof address.sun_path - 1);
-  const pid_t child = fork();
-  if (child == 0) {
-    const int fd = socket(AF_UNIX, SOCK_STREAM, 0);
-    if (fd < 0 || connect(fd, reinterpret_cast<sockaddr*>(&address), sizeof address) != 0) _exit(1);
-    // The connect answer first, then the rest.
-    if (write(fd, bytes.data(), 16) != 16) _exit(2);
-    char answer;
-    if (read(fd, &answer, 1) != 1) _exit(3);
-    const std::size_t rest = bytes.size() - 16;
-    if (write(fd, bytes.data() + 16, rest) != static_cast<ssize_t>(rest)) _exit(4);
-    char drain;
-    while (read(fd, &drain, 1) > 0) {
-    }
-    _exit(0);
-  }
+  std::strncpy(address.sun_path, path.c_str(), sizeof address.sun_path - 1);
+  return address;
 }
 
-void ReapChildren() {
-  while (waitpid(-1, nullptr, WNOHANG) > 0) {
+// Sends the toolkit's wire bytes of a conversation that executes `command`
+// from a child process (which only makes system calls), so that the server
+// in this process can answer meanwhile.
+void SendFromChild(const std::string& socketPath, const std::string& command) {
+  const auto length = [](std::uint32_t n) { return std::string(reinterpret_cast<char*>(&n), 4); };
+  const std::string open = '\x0a' + length(11) + "CommandLine";
+  const std::string rest = "\x01\x01" + length(command.size() + 1) + command + '\0' + '\x0b';
+  const sockaddr_un address = Address(socketPath);
+  if (fork() != 0) return;
+  const int fd = socket(AF_UNIX, SOCK_STREAM, 0);
+  char answer;
+  if (connect(fd, reinterpret_cast<const sockaddr*>(&address), sizeof address) != 0 ||
+      write(fd, open.data(), open.size()) != ssize_t(open.size()) || read(fd, &answer, 1) != 1 ||
+      write(fd, rest.data(), rest.size()) != ssize_t(rest.size()))
+    _exit(1);
+  while (read(fd, &answer, 1) > 0) {
   }
+  _exit(0);
 }
 
 class CommandServerTest : public ::testing::Test {
@@ -82,12 +62,11 @@ class CommandServerTest : public ::testing::Test {
   }
   void TearDown() override {
     SetCommandRunner({});
-    ReapChildren();
+    while (waitpid(-1, nullptr, WNOHANG) > 0) {
+    }
   }
   bool Ran(const std::string& command) const {
-    for (const auto& c : ran_)
-      if (c == command) return true;
-    return false;
+    return std::find(ran_.begin(), ran_.end(), command) != ran_.end();
   }
 
   TempDir dir_;
@@ -195,15 +174,10 @@ TEST_F(CommandServerTest, SocketPathRules) {
 
 TEST_F(CommandServerTest, StaleSocketIsReplacedAndAnotherInstancesSocketIsKept) {
   const std::string path = dir_ / "sock";
-  {
-    // What a killed instance leaves: a socket file nobody listens on.
-    const int fd = socket(AF_UNIX, SOCK_STREAM, 0);
-    sockaddr_un address{};
-    address.sun_family = AF_UNIX;
-    std::strncpy(address.sun_path, path.c_str(), sizeof address.sun_path - 1);
-    ASSERT_EQ(bind(fd, reinterpret_cast<sockaddr*>(&address), sizeof address), 0);
-    close(fd);
-  }
+  const int fd = socket(AF_UNIX, SOCK_STREAM, 0);  // a killed instance's leftover
+  const sockaddr_un address = Address(path);
+  ASSERT_EQ(bind(fd, reinterpret_cast<const sockaddr*>(&address), sizeof address), 0);
+  close(fd);
   std::unique_ptr<MyServer> server(StartCommandServer(path));
   ASSERT_TRUE(server);
 
@@ -215,34 +189,26 @@ TEST_F(CommandServerTest, StaleSocketIsReplacedAndAnotherInstancesSocketIsKept) 
   EXPECT_TRUE(std::filesystem::exists(path));
 }
 
-TEST(LogTarget, FrameworkLevelsBecomeTagsAndLevels) {
+TEST(LogTarget, FrameworkLevelsBecomeTagsAndAssertionsAreReported) {
   struct Row {
     wxLogLevel level;
     const char* prefix;
     int libraryLevel;
   };
-  const Row rows[] = {
-      {wxLOG_FatalError, "Docuvane-WX-ERROR: ", 5}, {wxLOG_Error, "Docuvane-WX-ERROR: ", 5},
-      {wxLOG_Warning, "Docuvane-WX-WARNING: ", 4},  {wxLOG_Message, "Docuvane-WX-INFO: ", 3},
-      {wxLOG_Status, "Docuvane-WX-INFO: ", 3},      {wxLOG_Info, "Docuvane-WX-INFO: ", 3},
-      {wxLOG_Debug, "Docuvane-WX-INFO: ", 3},
-  };
-  MyLogGui log;
+  const Row rows[] = {{wxLOG_FatalError, "Docuvane-WX-ERROR: ", 5},
+                      {wxLOG_Warning, "Docuvane-WX-WARNING: ", 4},
+                      {wxLOG_Message, "Docuvane-WX-INFO: ", 3},
+                      {wxLOG_Debug, "Docuvane-WX-INFO: ", 3}};
+  MyAppTraits traits;
+  std::unique_ptr<wxLog> log(traits.CreateLogTarget());
+  ASSERT_NE(dynamic_cast<MyLogGui*>(log.get()), nullptr);
   for (const Row& row : rows) {
     MessageCapture capture;
-    log.LogTextAtLevel(row.level, "some text");
+    log->LogTextAtLevel(row.level, "some text");
     ASSERT_EQ(capture.messages().size(), 1u) << row.level;
-    EXPECT_EQ(capture.messages()[0].prefix, row.prefix) << row.level;
-    EXPECT_EQ(capture.messages()[0].text, "some text") << row.level;
+    EXPECT_EQ(capture.messages()[0].line(), row.prefix + std::string("some text")) << row.level;
     EXPECT_EQ(capture.messages()[0].level, row.libraryLevel) << row.level;
   }
-}
-
-TEST(LogTarget, TraitsMakeTheTargetAndReportAssertions) {
-  MyAppTraits traits;
-  std::unique_ptr<wxLog> target(traits.CreateLogTarget());
-  EXPECT_NE(dynamic_cast<MyLogGui*>(target.get()), nullptr);
-
   MessageCapture capture;
   EXPECT_FALSE(traits.ShowAssertDialog("x > 0 failed"));
   EXPECT_FALSE(traits.ShowAssertDialog("again"));  // later assertions are still reported

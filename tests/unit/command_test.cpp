@@ -16,18 +16,6 @@ namespace {
 
 using testing_support::MessageCapture;
 
-// Runs with a UTF-8 character type, as the program does under a desktop.
-class Utf8Locale {
- public:
-  Utf8Locale() : old_(std::setlocale(LC_CTYPE, nullptr)) {
-    if (std::setlocale(LC_CTYPE, "C.UTF-8") == nullptr) std::setlocale(LC_CTYPE, "en_US.UTF-8");
-  }
-  ~Utf8Locale() { std::setlocale(LC_CTYPE, old_.c_str()); }
-
- private:
-  std::string old_;
-};
-
 std::string Join(std::vector<std::wstring> args) {
   args.insert(args.begin(), L"docuvane");
   std::vector<const wchar_t*> argv;
@@ -36,63 +24,43 @@ std::string Join(std::vector<std::wstring> args) {
   return Command_Line(static_cast<int>(args.size()), argv.data());
 }
 
-TEST(CommandLine, JoinsAndQuotesOnlyArgumentsWithBlanks) {
-  Utf8Locale utf8;
+TEST(CommandLine, JoinsQuotesAndCuts) {
   struct Row {
     const char* what;
     std::vector<std::wstring> args;
     std::string joined;
+    bool cut = false;
+    const char* locale = "C.UTF-8";
   };
   const Row rows[] = {
       {"no argument gives an empty line", {}, ""},
       {"one word as it is", {L"\\section"}, "\\section"},
       {"only the argument with a blank is quoted", {L"a", L"b c", L"d"}, "a \"b c\" d"},
       {"an empty argument adds only its blank", {L"a", L"", L"b"}, "a  b"},
-      {"an empty argument alone", {L""}, ""},
       {"a tab does not quote", {L"x\ty"}, "x\ty"},
       {"inner quotes are not escaped", {L"say \"hi\""}, "\"say \"hi\"\""},
       {"a leading blank quotes", {L" x"}, "\" x\""},
       {"non-ASCII in the locale's encoding", {L"\u00e9t\u00e9"}, "\xc3\xa9t\xc3\xa9"},
+      {"outside the locale: a question mark", {L"a\u4e2db"}, "a?b", false, "C"},
       {"shell characters are plain text", {L"$(rm -rf ~);`x`|&"}, "\"$(rm -rf ~);`x`|&\""},
+      {"1023 characters fit", {std::wstring(1023, L'a')}, std::string(1023, 'a')},
+      {"1024 characters are cut to 1023", {std::wstring(1024, L'a')}, std::string(1023, 'a'), true},
+      {"never cut inside a character",
+       {std::wstring(1022, L'a') + L"\u00e9"},
+       std::string(1022, 'a'),
+       true},
   };
+  const std::string old = std::setlocale(LC_CTYPE, nullptr);
   for (const Row& row : rows) {
+    ASSERT_NE(std::setlocale(LC_CTYPE, row.locale), nullptr) << row.locale;
     MessageCapture capture;
     EXPECT_EQ(Join(row.args), row.joined) << row.what;
-    ASSERT_EQ(capture.messages().size(), 1u) << row.what;
-    EXPECT_EQ(capture.messages()[0].line(), "INFO: Command_Line - " + row.joined) << row.what;
-    EXPECT_EQ(capture.messages()[0].level, 2) << row.what;
+    ASSERT_FALSE(capture.messages().empty()) << row.what;
+    EXPECT_EQ(capture.LevelOf("WARNING: Command_Line "), row.cut ? 4 : -1) << row.what;
+    EXPECT_EQ(capture.messages().back().line(), "INFO: Command_Line - " + row.joined) << row.what;
+    EXPECT_EQ(capture.messages().back().level, 2) << row.what;
   }
-}
-
-TEST(CommandLine, CharacterOutsideTheLocaleBecomesQuestionMark) {
-  const std::string old = std::setlocale(LC_CTYPE, nullptr);
-  std::setlocale(LC_CTYPE, "C");
-  EXPECT_EQ(Join({L"a\u4e2db"}), "a?b");
   std::setlocale(LC_CTYPE, old.c_str());
-}
-
-TEST(CommandLine, OverlongLineIsCutWithWarning) {
-  Utf8Locale utf8;
-  struct Row {
-    const char* what;
-    std::wstring arg;
-    std::size_t length;
-    bool warned;
-  };
-  const Row rows[] = {
-      {"1023 characters fit", std::wstring(1023, L'a'), 1023, false},
-      {"1024 characters are cut to 1023", std::wstring(1024, L'a'), 1023, true},
-      {"10,000 characters are cut to 1023", std::wstring(10000, L'x'), 1023, true},
-      // 1022 ASCII bytes and a two-byte character: the character is dropped whole.
-      {"never cut inside a character", std::wstring(1022, L'a') + L"\u00e9", 1022, true},
-  };
-  for (const Row& row : rows) {
-    MessageCapture capture;
-    const std::string line = Join({row.arg});
-    EXPECT_EQ(line.size(), row.length) << row.what;
-    EXPECT_EQ(capture.LevelOf("WARNING: Command_Line "), row.warned ? 4 : -1) << row.what;
-    EXPECT_TRUE(capture.Contains("INFO: Command_Line - ")) << row.what;
-  }
 }
 
 // Records what ProcessCommand asks of the panel.
@@ -131,8 +99,6 @@ class FakePanel : public CommandPanel {
 class ProcessCommandTest : public ::testing::Test {
  protected:
   void SetUp() override {
-    savedCount_ = DocumentCount;
-    savedTrace_ = TraceMode;
     TraceMode = 0;
     KeywordListReset();
     DocumentCount = 2;
@@ -148,15 +114,16 @@ class ProcessCommandTest : public ::testing::Test {
     DocumentCount = savedCount_;
     TraceMode = savedTrace_;
   }
-
- private:
-  int savedCount_ = 0;
-  int savedTrace_ = 0;
+  const int savedCount_ = DocumentCount, savedTrace_ = TraceMode;
 };
 
-TEST_F(ProcessCommandTest, GrammarTable) {
+// The calls of a word search that finds nothing in the list.
+std::vector<std::string> NotListed(const std::string& word) {
+  return {"search:" + word, "find:" + word + "/1", "show:" + word + "/1"};
+}
+
+TEST_F(ProcessCommandTest, Grammar) {
   const std::string help = "open:lomari/help.pdf#first";
-  const std::string longWord(10000, 'w');
   struct Row {
     const char* what;
     std::string command;
@@ -168,15 +135,12 @@ TEST_F(ProcessCommandTest, GrammarTable) {
       {"a hash mark is dropped", "#.LMR.Help", {help}},
       {"question mark then hash mark: both dropped", "?#.LMR.Help", {help}},
       {"question mark alone before a topic", "?.LMR.Help", {help}},
-      {"hash mark then question mark keeps the question mark",
-       "#?.LMR.Help",
-       {"search:?.LMR.Help", "find:?.LMR.Help/1", "show:?.LMR.Help/1"}},
-      {"an unknown topic is looked up as a word, dot included",
-       ".LMR.Nothing",
-       {"search:.LMR.Nothing", "find:.LMR.Nothing/1", "show:.LMR.Nothing/1"}},
-      {"a topic naming no document falls through to the word search",
-       ".LMR.Broken",
-       {"search:.LMR.Broken", "find:.LMR.Broken/1", "show:.LMR.Broken/1"}},
+      {"hash mark then question mark keeps the question mark", "#?.LMR.Help",
+       NotListed("?.LMR.Help")},
+      {"an unknown topic is looked up as a word, dot included", ".LMR.Nothing",
+       NotListed(".LMR.Nothing")},
+      {"a topic naming no document falls through to the word search", ".LMR.Broken",
+       NotListed(".LMR.Broken")},
       {"an exact word wins over an earlier prefix match",
        "\\section",
        {"search:\\section", "find:\\section/1", "select:1", "show:\\section/1"}},
@@ -190,18 +154,11 @@ TEST_F(ProcessCommandTest, GrammarTable) {
        "?#",
        {"search:", "find:/1", "select:0", "show:\\Section/1"}},
       {"empty command does nothing", "", {}},
-      {"quotes stay part of the body",
-       "\"b c\"",
-       {"search:\"b c\"", "find:\"b c\"/1", "show:\"b c\"/1"}},
-      {"shell characters are a word like any other",
-       "$(touch x);`id`",
-       {"search:$(touch x);`id`", "find:$(touch x);`id`/1", "show:$(touch x);`id`/1"}},
-      {"invalid UTF-8 passes as bytes",
-       "\xff\xfe\x80",
-       {"search:\xff\xfe\x80", "find:\xff\xfe\x80/1", "show:\xff\xfe\x80/1"}},
-      {"10,000 characters",
-       longWord,
-       {"search:" + longWord, "find:" + longWord + "/1", "show:" + longWord + "/1"}},
+      {"quotes stay part of the body", "\"b c\"", NotListed("\"b c\"")},
+      {"shell characters are a word like any other", "$(touch x);`id`",
+       NotListed("$(touch x);`id`")},
+      {"invalid UTF-8 passes as bytes", "\xff\xfe\x80", NotListed("\xff\xfe\x80")},
+      {"10,000 characters", std::string(10000, 'w'), NotListed(std::string(10000, 'w'))},
   };
   for (const Row& row : rows) {
     FakePanel panel;
@@ -210,51 +167,26 @@ TEST_F(ProcessCommandTest, GrammarTable) {
   }
 }
 
-TEST_F(ProcessCommandTest, MissingControlsAndNullCommand) {
+TEST_F(ProcessCommandTest, MissingControlsNullCommandAndTraces) {
   FakePanel bare;
-  bare.hasSearch = false;
-  bare.hasList = false;
+  bare.hasSearch = bare.hasList = false;
   ProcessCommand(bare, "\\section", 1);
   EXPECT_EQ(bare.calls, std::vector<std::string>{"show:\\section/1"});
-
   FakePanel panel;
   EXPECT_EQ(ProcessCommand(panel, nullptr, 1), 1);
   EXPECT_TRUE(panel.calls.empty());
+  ProcessCommand(panel, "\\section", 0);
+  EXPECT_EQ(panel.calls[1], "find:\\section/0");
+  EXPECT_EQ(panel.calls[2], "select:0");  // the first prefix match ignoring case
 
-  FakePanel inexact;
-  ProcessCommand(inexact, "\\section", 0);
-  EXPECT_EQ(inexact.calls[1], "find:\\section/0");
-  EXPECT_EQ(inexact.calls[2], "select:0");  // the first prefix match ignoring case
-}
-
-TEST_F(ProcessCommandTest, Traces) {
-  struct Row {
-    const char* what;
-    int traceMode;
-    const char* command;
-    const char* received;  // NULL: no "Received Command: " trace
-    const char* keyword;   // NULL: no "Search Keyword: " trace
-  };
-  const Row rows[] = {
-      {"the keyword trace shows what follows the question mark", 0, "?#x", nullptr,
-       "Search Keyword: #x"},
-      {"received commands are traced only in trace mode", 1, "?#x", "Received Command: ?#x",
-       "Search Keyword: #x"},
-      {"an empty command gets only the optional trace", 1, "", "Received Command: ", nullptr},
-  };
-  for (const Row& row : rows) {
-    TraceMode = row.traceMode;
+  // The keyword trace shows what follows the question mark; received
+  // commands are traced only in trace mode.
+  for (const int mode : {0, 1}) {
+    TraceMode = mode;
     MessageCapture capture;
-    FakePanel panel;
-    ProcessCommand(panel, row.command, 1);
-    EXPECT_EQ(capture.Contains("Received Command: "), row.received != nullptr) << row.what;
-    if (row.received) {
-      EXPECT_TRUE(capture.Contains(row.received)) << row.what;
-    }
-    EXPECT_EQ(capture.Contains("Search Keyword: "), row.keyword != nullptr) << row.what;
-    if (row.keyword) {
-      EXPECT_TRUE(capture.Contains(row.keyword)) << row.what;
-    }
+    ProcessCommand(panel, "?#x", 1);
+    EXPECT_TRUE(capture.Contains("Search Keyword: #x")) << mode;
+    EXPECT_EQ(capture.Contains("Received Command: ?#x"), mode == 1) << mode;
   }
 }
 

@@ -8,6 +8,11 @@
 #include <sys/wait.h>
 #include <unistd.h>
 
+#include <filesystem>
+#include <fstream>
+#include <functional>
+#include <utility>
+
 #include "test_support.h"
 
 namespace {
@@ -18,147 +23,99 @@ using testing_support::TempDir;
 
 const char* const kName = "Lomari-Docuvane-tester";
 
-// A child process that takes the lock, reports it through a pipe and waits
-// to be killed.  Returns its pid, or -1.
-pid_t StartHolder(const std::string& dir) {
+// A child that holds the lock and has started a program of its own, which
+// must not inherit the lock.  Its pid and the program's, or -1 when the child
+// could not take the lock.
+std::pair<pid_t, pid_t> StartHolder(const std::string& dir) {
   int ready[2];
-  if (pipe(ready) != 0) return -1;
+  if (pipe(ready) != 0) return {-1, -1};
   const pid_t pid = fork();
   if (pid == 0) {
-    close(ready[0]);
     InstanceLock lock;
-    const char answer = lock.Create(kName, dir) ? 'y' : 'n';
-    if (write(ready[1], &answer, 1) != 1) _exit(2);
+    pid_t viewer = -1;
+    int execed[2];  // closes in the program when exec has happened
+    if (!lock.Create(kName, dir) || pipe2(execed, O_CLOEXEC) != 0) _exit(1);
+    if ((viewer = fork()) == 0) execl("/bin/sleep", "sleep", "30", static_cast<char*>(nullptr));
+    close(execed[1]);
+    char byte;
+    if (read(execed[0], &byte, 1) != 0 || write(ready[1], &viewer, sizeof viewer) != sizeof viewer)
+      _exit(2);
     pause();
-    _exit(0);
   }
   close(ready[1]);
-  char answer = 0;
-  const bool ok = read(ready[0], &answer, 1) == 1 && answer == 'y';
+  pid_t viewer = -1;
+  const bool ok = read(ready[0], &viewer, sizeof viewer) == sizeof viewer;
   close(ready[0]);
-  if (!ok && pid > 0) {
-    kill(pid, SIGKILL);
-    waitpid(pid, nullptr, 0);
-    return -1;
-  }
-  return pid;
+  return {ok ? pid : -1, viewer};
 }
 
-TEST(InstanceLock, OneHolderAtATime) {
+TEST(InstanceLock, OneHolderAtATimeUntilReleasedOrKilled) {
   TempDir dir;
-  InstanceLock first;
-  ASSERT_TRUE(first.Create(kName, dir.path()));
-  EXPECT_FALSE(first.IsAnotherRunning());
-  EXPECT_TRUE(first.HoldsLock());
-
-  InstanceLock second;
-  EXPECT_FALSE(second.Create(kName, dir.path()));
-  EXPECT_TRUE(second.IsAnotherRunning());
-
-  InstanceLock otherUser;  // another name: another user's lock
-  EXPECT_TRUE(otherUser.Create("Lomari-Docuvane-someone", dir.path()));
-
-  first.Release();
-  EXPECT_TRUE(second.Create(kName, dir.path()));
-  EXPECT_FALSE(second.IsAnotherRunning());
-}
-
-TEST(InstanceLock, LeftoverFilesNeverBlock) {
-  struct Row {
-    const char* what;
-    std::string content;
-  };
-  const Row rows[] = {
-      {"an empty lock file", ""},
-      {"a lock file naming a live process of this user", std::to_string(getppid()) + "\n"},
-      {"a lock file naming no process", "999999999\n"},
-      {"garbage", "\x01\x02not a pid"},
-  };
-  for (const Row& row : rows) {
-    TempDir dir;
-    dir.Write(std::string(kName) + ".lock", row.content);
-    InstanceLock lock;
-    EXPECT_TRUE(lock.Create(kName, dir.path())) << row.what;
-    EXPECT_FALSE(lock.IsAnotherRunning()) << row.what;
-  }
-}
-
-TEST(InstanceLock, KilledHolderReleasesTheLock) {
-  TempDir dir;
-  const pid_t holder = StartHolder(dir.path());
+  const auto [holder, viewer] = StartHolder(dir.path());
   ASSERT_GT(holder, 0);
-
   InstanceLock waiting;
   EXPECT_FALSE(waiting.Create(kName, dir.path()));
   EXPECT_TRUE(waiting.IsAnotherRunning());
+  InstanceLock otherUser;  // another name: another user's lock
+  EXPECT_TRUE(otherUser.Create("Lomari-Docuvane-someone", dir.path()));
 
-  kill(holder, SIGKILL);
+  kill(holder, SIGKILL);  // the program it started lives on
   waitpid(holder, nullptr, 0);
-  EXPECT_TRUE(waiting.Create(kName, dir.path()));
+  ASSERT_TRUE(waiting.Create(kName, dir.path()));
   EXPECT_FALSE(waiting.IsAnotherRunning());
-}
-
-TEST(InstanceLock, ProgramsStartedByTheHolderDoNotKeepIt) {
-  TempDir dir;
-  InstanceLock lock;
-  ASSERT_TRUE(lock.Create(kName, dir.path()));
-  // The pipe closes in the child when exec has happened.
-  int execed[2];
-  ASSERT_EQ(pipe2(execed, O_CLOEXEC), 0);
-  const pid_t viewer = fork();
-  if (viewer == 0) {
-    execl("/bin/sleep", "sleep", "30", static_cast<char*>(nullptr));
-    _exit(127);
-  }
-  ASSERT_GT(viewer, 0);
-  close(execed[1]);
-  char byte;
-  ASSERT_EQ(read(execed[0], &byte, 1), 0);
-  close(execed[0]);
-  lock.Release();
+  EXPECT_TRUE(waiting.HoldsLock());
 
   InstanceLock next;
+  EXPECT_FALSE(next.Create(kName, dir.path()));
+  waiting.Release();
   EXPECT_TRUE(next.Create(kName, dir.path()));
   kill(viewer, SIGKILL);
-  waitpid(viewer, nullptr, 0);
 }
 
-TEST(InstanceLock, UnusableLockPlaceLetsTheProgramStart) {
+TEST(InstanceLock, LeftoverFilesNeverBlockAndUnusablePlacesLetTheProgramStart) {
   struct Row {
     const char* what;
-    bool symlink;  // a link at the lock path; else a refused runtime directory
+    std::function<void(const std::string& lockPath)> prepare;
+    bool taken;
   };
-  const Row rows[] = {{"a symbolic link at the lock path", true},
-                      {"a runtime directory open to others", false}};
+  const auto content = [](std::string text) {
+    return [text](const std::string& path) { std::ofstream(path) << text; };
+  };
+  const Row rows[] = {
+      {"no lock file", [](const std::string&) {}, true},
+      {"an empty lock file", content(""), true},
+      {"a lock file naming a live process of this user", content(std::to_string(getppid())), true},
+      {"a lock file naming no process", content("999999999\n"), true},
+      {"garbage", content("\x01\x02not a pid"), true},
+      {"a symbolic link at the lock path",
+       [](const std::string& path) {
+         EXPECT_EQ(symlink((path + "-elsewhere").c_str(), path.c_str()), 0);
+       },
+       false},
+      {"a runtime directory open to others",
+       [](const std::string& path) { chmod(path.substr(0, path.rfind('/')).c_str(), 0755); },
+       false},
+  };
   for (const Row& row : rows) {
     TempDir dir;
+    ScopedEnv runtime("XDG_RUNTIME_DIR", dir.path());
+    const std::string path = dir.path() + "/lomari/" + kName + ".lock";
+    ASSERT_EQ(mkdir((dir / "lomari").c_str(), 0700), 0);
+    row.prepare(path);
+    const bool fresh = !std::filesystem::exists(path);
     MessageCapture capture;
     InstanceLock lock;
-    if (row.symlink) {
-      ASSERT_EQ(
-          symlink((dir / "elsewhere").c_str(), (dir / (std::string(kName) + ".lock")).c_str()), 0);
-      EXPECT_FALSE(lock.Create(kName, dir.path())) << row.what;
-    } else {
-      ScopedEnv runtime("XDG_RUNTIME_DIR", dir.path());
-      ASSERT_EQ(mkdir((dir / "lomari").c_str(), 0755), 0);
-      chmod((dir / "lomari").c_str(), 0755);
-      EXPECT_FALSE(lock.Create(kName)) << row.what;
-    }
+    EXPECT_EQ(lock.Create(kName), row.taken) << row.what;
+    EXPECT_EQ(lock.HoldsLock(), row.taken) << row.what;
     EXPECT_FALSE(lock.IsAnotherRunning()) << row.what;
-    EXPECT_FALSE(lock.HoldsLock()) << row.what;
-    EXPECT_EQ(capture.LevelOf("ERROR: "), 5) << row.what;
+    EXPECT_EQ(capture.LevelOf("ERROR: "), row.taken ? -1 : 5) << row.what;
+    struct stat st;
+    if (row.taken) {
+      EXPECT_EQ(lock.path(), path);
+      ASSERT_EQ(stat(path.c_str(), &st), 0) << row.what;
+      EXPECT_TRUE(!fresh || (st.st_mode & 0777) == 0600) << "a new lock file is private";
+    }
   }
-}
-
-TEST(InstanceLock, DefaultPlaceIsTheRuntimeDirectory) {
-  TempDir dir;
-  ScopedEnv runtime("XDG_RUNTIME_DIR", dir.path());
-  InstanceLock lock;
-  ASSERT_TRUE(lock.Create(kName));
-  EXPECT_EQ(lock.path(), dir.path() + "/lomari/" + kName + ".lock");
-  struct stat st;
-  ASSERT_EQ(stat(lock.path().c_str(), &st), 0);
-  EXPECT_EQ(st.st_mode & 0777, 0600u);
 }
 
 }  // namespace
