@@ -91,12 +91,8 @@ struct Process {
     return WaitFor([&] { return !Running(); }, limit) ? status : -1;
   }
   void Kill(int signal = SIGKILL) {
-    if (!Running()) return;
-    kill(pid, signal);
-    if (Wait(milliseconds(5000)) < 0) {
-      kill(pid, SIGKILL);
-      Wait();
-    }
+    if (Running()) kill(pid, signal);
+    Wait();
   }
   void Stop() { Kill(SIGTERM); }
   Log Lines() const {
