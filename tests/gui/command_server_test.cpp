@@ -15,6 +15,7 @@
 #include <cstring>
 #include <filesystem>
 #include <fstream>
+#include <functional>
 #include <memory>
 #include <string>
 #include <vector>
@@ -80,51 +81,34 @@ TEST_F(CommandServerTest, CommandDuringModalDialogWaitsUntilItCloses) {
   ASSERT_TRUE(server);
 
   wxDialog dialog(nullptr, wxID_ANY, "busy");
-  int step = 0;
   bool heldWhileModal = false;
+  // Each step runs on a timer tick until it returns true.
+  const std::vector<std::function<bool()>> steps = {
+      [&] { return SendFromChild(path, "first"), true; },
+      [&] { return Ran("first") && (wxTheApp->CallAfter([&] { dialog.ShowModal(); }), true); },
+      [&] { return dialog.IsModal() && (SendFromChild(path, "second"), true); },
+      [&] {
+        if (!capture.Contains("INFO: DDE server Execute second")) return false;
+        heldWhileModal = !Ran("second") && DeferredCommandCount() == 1;
+        dialog.EndModal(0);
+        return true;
+      },
+      [&] { return Ran("second"); }};
+  std::size_t step = 0;
   const auto deadline = std::chrono::steady_clock::now() + std::chrono::seconds(20);
   wxTimer timer;
   timer.Bind(wxEVT_TIMER, [&](wxTimerEvent&) {
-    if (std::chrono::steady_clock::now() > deadline) {
-      if (dialog.IsModal()) dialog.EndModal(0);
-      wxTheApp->ExitMainLoop();
-      return;
-    }
-    switch (step) {
-      case 0:
-        SendFromChild(path, "first");
-        step = 1;
-        break;
-      case 1:
-        if (Ran("first")) {
-          step = 2;
-          wxTheApp->CallAfter([&] { dialog.ShowModal(); });
-        }
-        break;
-      case 2:
-        if (dialog.IsModal()) {
-          SendFromChild(path, "second");
-          step = 3;
-        }
-        break;
-      case 3:
-        if (capture.Contains("INFO: DDE server Execute second")) {
-          heldWhileModal = !Ran("second") && DeferredCommandCount() == 1;
-          dialog.EndModal(0);
-          step = 4;
-        }
-        break;
-      case 4:
-        if (Ran("second")) wxTheApp->ExitMainLoop();
-        break;
-    }
+    if (step < steps.size() && steps[step]()) ++step;
+    if (step < steps.size() && std::chrono::steady_clock::now() < deadline) return;
+    if (dialog.IsModal()) dialog.EndModal(0);
+    wxTheApp->ExitMainLoop();
   });
   timer.Start(10);
   wxTheApp->CallAfter([] {});  // the loop needs something to start on
   wxTheApp->MainLoop();
   timer.Stop();
 
-  EXPECT_EQ(step, 4);
+  EXPECT_EQ(step, steps.size());
   EXPECT_TRUE(Ran("first"));
   EXPECT_TRUE(heldWhileModal) << "a command must not run inside a modal dialog";
   EXPECT_TRUE(Ran("second"));
