@@ -117,9 +117,13 @@ class ProcessCommandTest : public ::testing::Test {
   const int savedCount_ = DocumentCount, savedTrace_ = TraceMode;
 };
 
-// The calls of a word search that finds nothing in the list.
-std::vector<std::string> NotListed(const std::string& word) {
-  return {"search:" + word, "find:" + word + "/1", "show:" + word + "/1"};
+// The calls of a word search: selecting list row `row` (none when -1) and
+// showing `shown` (the word itself when empty).
+std::vector<std::string> Search(const std::string& word, int row = -1, std::string shown = "") {
+  std::vector<std::string> calls = {"search:" + word, "find:" + word + "/1"};
+  if (row >= 0) calls.push_back("select:" + std::to_string(row));
+  calls.push_back("show:" + (shown.empty() ? word : shown) + "/1");
+  return calls;
 }
 
 TEST_F(ProcessCommandTest, Grammar) {
@@ -135,30 +139,20 @@ TEST_F(ProcessCommandTest, Grammar) {
       {"a hash mark is dropped", "#.LMR.Help", {help}},
       {"question mark then hash mark: both dropped", "?#.LMR.Help", {help}},
       {"question mark alone before a topic", "?.LMR.Help", {help}},
-      {"hash mark then question mark keeps the question mark", "#?.LMR.Help",
-       NotListed("?.LMR.Help")},
+      {"hash mark then question mark keeps the question mark", "#?.LMR.Help", Search("?.LMR.Help")},
       {"an unknown topic is looked up as a word, dot included", ".LMR.Nothing",
-       NotListed(".LMR.Nothing")},
-      {"a topic naming no document falls through to the word search", ".LMR.Broken",
-       NotListed(".LMR.Broken")},
-      {"an exact word wins over an earlier prefix match",
-       "\\section",
-       {"search:\\section", "find:\\section/1", "select:1", "show:\\section/1"}},
-      {"a prefix shows the listed word",
-       "\\sectionm",
-       {"search:\\sectionm", "find:\\sectionm/1", "select:2", "show:\\sectionmark/1"}},
-      {"only a question mark searches the empty text",
-       "?",
-       {"search:", "find:/1", "select:0", "show:\\Section/1"}},
-      {"a question mark and hash mark alone",
-       "?#",
-       {"search:", "find:/1", "select:0", "show:\\Section/1"}},
+       Search(".LMR.Nothing")},
+      {"a topic naming no document falls through to the words", ".LMR.Broken",
+       Search(".LMR.Broken")},
+      {"an exact word wins over an earlier prefix match", "\\section", Search("\\section", 1)},
+      {"a prefix shows the listed word", "\\sectionm", Search("\\sectionm", 2, "\\sectionmark")},
+      {"only a question mark searches the empty text", "?", Search("", 0, "\\Section")},
+      {"a question mark and hash mark alone", "?#", Search("", 0, "\\Section")},
       {"empty command does nothing", "", {}},
-      {"quotes stay part of the body", "\"b c\"", NotListed("\"b c\"")},
-      {"shell characters are a word like any other", "$(touch x);`id`",
-       NotListed("$(touch x);`id`")},
-      {"invalid UTF-8 passes as bytes", "\xff\xfe\x80", NotListed("\xff\xfe\x80")},
-      {"10,000 characters", std::string(10000, 'w'), NotListed(std::string(10000, 'w'))},
+      {"quotes stay part of the body", "\"b c\"", Search("\"b c\"")},
+      {"shell characters are a word like any other", "$(touch x);`id`", Search("$(touch x);`id`")},
+      {"invalid UTF-8 passes as bytes", "\xff\xfe\x80", Search("\xff\xfe\x80")},
+      {"10,000 characters", std::string(10000, 'w'), Search(std::string(10000, 'w'))},
   };
   for (const Row& row : rows) {
     FakePanel panel;
