@@ -23,6 +23,7 @@
 
 #include "platform/paths.h"
 #include "shell/app.h"
+#include "shell/log_gui.h"
 #include "trovlib/trovlib.h"
 #include "window/frame.h"
 #include "window/panel.h"
@@ -43,14 +44,6 @@ constexpr std::uint32_t kMaxTopicBytes = 256;
 constexpr unsigned char kConnectMessage = 10;
 
 std::atomic<int> g_listenFd{-1};
-
-std::string Narrow(const wxString& text) {
-  const wxCharBuffer local = text.mb_str(wxConvLibc);
-  if (local.data() != nullptr && (local.length() != 0 || text.empty()))
-    return std::string(local.data(), local.length());
-  const wxScopedCharBuffer utf8 = text.utf8_str();
-  return std::string(utf8.data(), utf8.length());
-}
 
 void Message(const char* prefix, const std::string& text, int level = 2) {
   TrovMessage(prefix, text.c_str(), level);
@@ -290,7 +283,7 @@ bool MyServer::Create(const wxString& socketPath) {
 }
 
 wxConnectionBase* MyServer::OnAcceptConnection(const wxString& topic) {
-  Message("INFO: DDE server OnAcceptConnection ", Narrow(topic));
+  Message("INFO: DDE server OnAcceptConnection ", NarrowText(topic));
   if (topic != kCommandTopic) {
     Message("ERROR: DDE server ", "Unknown topic, connection refused", 5);
     return nullptr;
@@ -328,7 +321,7 @@ MyConnection::MyConnection(MyServer* server) : server_(server) {}
 MyConnection::~MyConnection() = default;
 
 bool MyConnection::OnExec(const wxString&, const wxString& data) {
-  const std::string command = Narrow(data);
+  const std::string command = NarrowText(data);
   Message("INFO: DDE server Execute ", command);
   RunOrDefer(command);
   return true;
@@ -353,10 +346,10 @@ const void* MyConnection::OnRequest(const wxString&, const wxString& item, size_
     *size = 3;
   }
   if (*size == 0) {
-    Message("ERROR: DDE server Unknown requestOnExecute ", Narrow(item));
+    Message("ERROR: DDE server Unknown requestOnExecute ", NarrowText(item));
     return nullptr;
   }
-  const std::string bytes = Narrow(reply);
+  const std::string bytes = NarrowText(reply);
   m_replyBuffer = wxCharBuffer(bytes.size());
   std::memcpy(m_replyBuffer.data(), bytes.c_str(), bytes.size() + 1);
   if (*size == 1) *size = bytes.size() + 1;  // the terminating NUL is counted
@@ -370,20 +363,20 @@ bool MyConnection::OnPoke(const wxString&, const wxString&, const void*, size_t,
 }
 
 bool MyConnection::OnStartAdvise(const wxString&, const wxString& item) {
-  Message("INFO: DDE server OnStartAdvise ", Narrow(item));
+  Message("INFO: DDE server OnStartAdvise ", NarrowText(item));
   m_adviseItem = item;
   return true;
 }
 
 bool MyConnection::OnStopAdvise(const wxString&, const wxString& item) {
-  Message("INFO: DDE server OnStopAdvise ", Narrow(item));
+  Message("INFO: DDE server OnStopAdvise ", NarrowText(item));
   m_adviseItem.clear();
   return true;
 }
 
 bool MyConnection::DoAdvise(const wxString& item, const void* data, size_t size,
                             wxIPCFormat format) {
-  Message("INFO: DDE server Advice ", Narrow(item));
+  Message("INFO: DDE server Advice ", NarrowText(item));
   return wxConnection::DoAdvise(item, data, size, format);
 }
 

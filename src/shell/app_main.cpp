@@ -76,9 +76,12 @@ class MyApp : public wxApp {
   wxDECLARE_EVENT_TABLE();
 };
 
-wxBEGIN_EVENT_TABLE(MyApp, wxApp) wxEND_EVENT_TABLE()
+// clang-format off
+wxBEGIN_EVENT_TABLE(MyApp, wxApp)
+wxEND_EVENT_TABLE()
+// clang-format on
 
-    wxIMPLEMENT_APP_NO_MAIN(MyApp);
+wxIMPLEMENT_APP_NO_MAIN(MyApp);
 
 bool MyApp::OnInit() {
   Phase("Start");

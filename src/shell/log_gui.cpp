@@ -5,17 +5,15 @@
 
 #include "trovlib/trovlib.h"
 
-namespace {
-
-// Framework text in the locale's 8-bit encoding; text the locale cannot
-// express goes out as UTF-8 rather than as nothing.
-std::string Narrow(const wxString& text) {
+std::string NarrowText(const wxString& text) {
   const wxCharBuffer local = text.mb_str(wxConvLibc);
   if (local.data() != nullptr && (local.length() != 0 || text.empty()))
     return std::string(local.data(), local.length());
   const wxScopedCharBuffer utf8 = text.utf8_str();
   return std::string(utf8.data(), utf8.length());
 }
+
+namespace {
 
 }  // namespace
 
@@ -34,14 +32,14 @@ LogRoute RouteOfLogLevel(wxLogLevel level) {
 void MyLogGui::DoLogTextAtLevel(wxLogLevel level, const wxString& msg) {
   const LogRoute route = RouteOfLogLevel(level);
   const std::string prefix = std::string("Docuvane") + "-" + route.tag;
-  TrovMessage(prefix.c_str(), Narrow(msg).c_str(), route.level);
+  TrovMessage(prefix.c_str(), NarrowText(msg).c_str(), route.level);
 }
 
 wxLog* MyAppTraits::CreateLogTarget() { return new MyLogGui; }
 
 bool MyAppTraits::ShowAssertDialog(const wxString& msg) {
   const std::string prefix = std::string("Docuvane") + "-Assert: ";
-  TrovMessage(prefix.c_str(), Narrow(msg).c_str(), 260);
+  TrovMessage(prefix.c_str(), NarrowText(msg).c_str(), 260);
   // No dialog, and later assertions are not suppressed.
   return false;
 }

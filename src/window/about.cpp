@@ -12,17 +12,11 @@
 
 #include "shell/app.h"
 #include "trovlib/trovlib.h"
+#include "window/picture.h"
 
 namespace {
 
 constexpr int kGap = 12;
-
-bool EndsWithBmp(const std::string& path) {
-  if (path.size() < 4) return false;
-  std::string tail = path.substr(path.size() - 4);
-  for (char& c : tail) c = static_cast<char>(std::tolower(static_cast<unsigned char>(c)));
-  return tail == ".bmp";
-}
 
 wxStaticText* CentredText(wxWindow* parent, const wxString& text) {
   return new wxStaticText(parent, wxID_ANY, text, wxDefaultPosition, wxDefaultSize,
@@ -38,10 +32,8 @@ AboutDlg::AboutDlg(wxWindow* parent)
   wxBoxSizer* column = new wxBoxSizer(wxVERTICAL);
 
   if (const char* found = TrovSearch("Logo", "Docuvane")) {
-    const std::string path = found;
-    wxImage image(wxString(path.c_str(), wxConvLocal), wxBITMAP_TYPE_ANY);
+    const wxImage image = LoadPicture(found);
     if (image.IsOk()) {
-      if (EndsWithBmp(path)) image.SetMaskColour(192, 192, 192);
       column->AddSpacer(kGap);
       column->Add(new wxStaticBitmap(this, wxID_ANY, wxBitmap(image)), 0, wxALIGN_CENTRE_HORIZONTAL);
     }

@@ -18,6 +18,7 @@
 #include <string>
 
 #include "trovlib/trovlib.h"
+#include "window/picture.h"
 #include "window/ids.h"
 #include "wordindex/qlistbox_gui.h"
 
@@ -25,13 +26,6 @@ namespace {
 
 constexpr long kDefaultSashDip = 300;
 constexpr int kGap = 12;
-
-bool EndsWithBmp(const std::string& path) {
-  if (path.size() < 4) return false;
-  std::string tail = path.substr(path.size() - 4);
-  for (char& c : tail) c = static_cast<char>(std::tolower(static_cast<unsigned char>(c)));
-  return tail == ".bmp";
-}
 
 }  // namespace
 
@@ -144,14 +138,10 @@ wxButton* Docuvane::MakeIconButton(wxWindow* parent, int id, const char* label, 
   wxButton* button = nullptr;
   const char* found = TrovSearch("Icon", iconName);
   if (found) {
-    const std::string path = found;
-    wxImage image(wxString(path.c_str(), wxConvLocal), wxBITMAP_TYPE_ANY, -1);
+    const wxImage image = LoadPicture(found);
     // An unreadable file still gives the picture button, just without a picture.
     wxBitmap bitmap;
-    if (image.IsOk()) {
-      if (EndsWithBmp(path)) image.SetMaskColour(192, 192, 192);
-      bitmap = wxBitmap(image);
-    }
+    if (image.IsOk()) bitmap = wxBitmap(image);
     button = new wxBitmapButton(parent, id, bitmap, wxDefaultPosition, size, wxBU_AUTODRAW,
                                 wxDefaultValidator, "button");
   } else {

@@ -143,7 +143,7 @@ TEST_F(WindowTest, IconFilesMakeSquarePictureButtons) {
       if (!installed) continue;
       const std::string path =
           root.Write("texmf/Docuvane/icons/" + std::string(b.file), "not a picture");
-      if (b.picture) ASSERT_TRUE(image.SaveFile(path));
+      if (b.picture) { ASSERT_TRUE(image.SaveFile(path)); }
     }
     ReopenFrame();
     const int h = panel()->m_gotoButton->GetSize().y;
