@@ -1,15 +1,12 @@
 // The desktop's side of document opening, on wxWidgets.
 #include "access/desktop_services_gui.h"
 
-#include <sys/stat.h>
-#include <unistd.h>
 
 #include <wx/msgdlg.h>
 #include <wx/progdlg.h>
 #include <wx/utils.h>
 #include <wx/window.h>
 
-#include <cstdlib>
 
 #include "access/download.h"
 #include "access/opendoc.h"
@@ -33,29 +30,6 @@ int AskUser(const std::string& message, const std::string& caption, long style) 
   const auto& hook = DesktopAccessServices::TestMessageBoxHook();
   if (hook) return hook(message, caption, style);
   return wxMessageBox(ToWx(message), ToWx(caption), style);
-}
-
-bool IsExecutable(const std::string& path) {
-  struct stat st;
-  return stat(path.c_str(), &st) == 0 && S_ISREG(st.st_mode) && access(path.c_str(), X_OK) == 0;
-}
-
-// wxExecute reports a program that cannot be started only from the child,
-// after the start has been called a success; look first.
-bool CanStart(const std::string& program) {
-  if (program.empty()) return false;
-  if (program.find('/') != std::string::npos) return IsExecutable(program);
-  const char* path = std::getenv("PATH");
-  std::string dirs = path ? path : "";
-  std::size_t start = 0;
-  while (start <= dirs.size()) {
-    std::size_t end = dirs.find(':', start);
-    if (end == std::string::npos) end = dirs.size();
-    std::string dir = end > start ? dirs.substr(start, end - start) : ".";
-    if (IsExecutable(dir + "/" + program)) return true;
-    start = end + 1;
-  }
-  return false;
 }
 
 // The progress dialog as the transfer sees it.
@@ -86,7 +60,9 @@ DesktopAccessServices::MessageBoxHook& DesktopAccessServices::TestMessageBoxHook
 DesktopAccessServices::DesktopAccessServices(wxWindow* parent) : parent_(parent) {}
 
 long DesktopAccessServices::Execute(const std::vector<std::string>& argv) {
-  if (argv.empty() || !CanStart(argv[0])) return 0;
+  // wxExecute reports a program that cannot be started only from the child,
+  // after the start has been called a success; look first.
+  if (argv.empty() || FindOnPath(argv[0]).empty()) return 0;
   // The vector form: every argument reaches the program as it is, with no
   // shell and no second splitting of the command line.
   std::vector<const char*> args;

@@ -36,24 +36,6 @@ bool IsExecutableFile(const std::string& path) {
   return stat(path.c_str(), &st) == 0 && S_ISREG(st.st_mode) && access(path.c_str(), X_OK) == 0;
 }
 
-std::string FindOnPath(const std::string& program) {
-  if (program.empty()) return std::string();
-  if (program.find('/') != std::string::npos)
-    return IsExecutableFile(program) ? program : std::string();
-  const char* path = std::getenv("PATH");
-  std::string dirs = path ? path : "/usr/local/bin:/usr/bin:/bin";
-  std::size_t start = 0;
-  while (start <= dirs.size()) {
-    std::size_t end = dirs.find(':', start);
-    if (end == std::string::npos) end = dirs.size();
-    std::string dir = dirs.substr(start, end - start);
-    if (dir.empty()) dir = ".";
-    std::string candidate = dir + "/" + program;
-    if (IsExecutableFile(candidate)) return candidate;
-    start = end + 1;
-  }
-  return std::string();
-}
 
 // Splits an Exec value into its words: blanks separate, double quotes group,
 // and inside quotes a backslash escapes the next character.
@@ -148,6 +130,25 @@ std::string FindDesktopFile(const std::string& id) {
 }
 
 }  // namespace
+
+std::string FindOnPath(const std::string& program) {
+  if (program.empty()) return std::string();
+  if (program.find('/') != std::string::npos)
+    return IsExecutableFile(program) ? program : std::string();
+  const char* path = std::getenv("PATH");
+  std::string dirs = path ? path : "/usr/local/bin:/usr/bin:/bin";
+  std::size_t start = 0;
+  while (start <= dirs.size()) {
+    std::size_t end = dirs.find(':', start);
+    if (end == std::string::npos) end = dirs.size();
+    std::string dir = dirs.substr(start, end - start);
+    if (dir.empty()) dir = ".";
+    std::string candidate = dir + "/" + program;
+    if (IsExecutableFile(candidate)) return candidate;
+    start = end + 1;
+  }
+  return std::string();
+}
 
 bool RunAndCapture(const char* const* argv, std::string& output, int timeoutMs) {
   output.clear();

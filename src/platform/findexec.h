@@ -10,6 +10,10 @@
 // involved, and every helper is bounded in time.
 std::string FindExecutable(const std::string& path);
 
+// Full path of `program` (a path, or a name searched on PATH) when it is an
+// executable file, else "".
+std::string FindOnPath(const std::string& program);
+
 // Runs argv (searched on PATH) without a shell and returns its standard
 // output; false when it cannot be started, fails, or outlives `timeoutMs`.
 bool RunAndCapture(const char* const* argv, std::string& output, int timeoutMs);
