@@ -33,13 +33,13 @@
 #include "catalogue/keywords.h"
 #include "catalogue/pool.h"
 #include "platform/profile.h"
-#include "shell/settings.h"
+#include "base/settings.h"
 #include "test_support.h"
 #include "trovlib/trovlib.h"
 #include "window/frame.h"
 #include "window/panel.h"
 #include "wordindex/index_writer.h"
-#include "wordindex/qlistbox_gui.h"
+#include "window/qlistbox.h"
 #include "wordindex/wordindex.h"
 
 namespace {

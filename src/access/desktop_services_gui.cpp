@@ -11,20 +11,12 @@
 #include "access/download.h"
 #include "access/opendoc.h"
 #include "access/opendoc_gui.h"
+#include "text/wxtext_gui.h"
 #include "platform/findexec.h"
 
 namespace {
 
 constexpr int kExpectedSize = 16777216;  // bytes that fill the progress range
-
-// The program's strings are in the locale's encoding; a text that does not
-// convert (a C locale, stray bytes) is still shown rather than dropped.
-wxString ToWx(const std::string& text) {
-  wxString converted(text.c_str(), wxConvLocal);
-  if (converted.empty() && !text.empty()) converted = wxString::FromUTF8(text.c_str());
-  if (converted.empty() && !text.empty()) converted = wxString(text.c_str(), wxConvISO8859_1);
-  return converted;
-}
 
 int AskUser(const std::string& message, const std::string& caption, long style) {
   const auto& hook = DesktopAccessServices::TestMessageBoxHook();

@@ -16,6 +16,7 @@
 #include <mutex>
 
 #include "trovlib/trovlib.h"
+#include "text/text.h"
 
 namespace {
 
@@ -60,20 +61,6 @@ std::string EscapeUrl(const std::string& url) {
     }
   }
   return out;
-}
-
-// Cuts to the message capacity without splitting a UTF-8 sequence.
-std::string CutMessage(std::string text) {
-  if (text.size() <= kMessageLimit) return text;
-  std::size_t end = kMessageLimit;
-  while (end > 0 && (static_cast<unsigned char>(text[end]) & 0xC0) == 0x80) --end;
-  text.resize(end);
-  return text;
-}
-
-std::string Lower(std::string text) {
-  for (char& c : text) c = static_cast<char>(std::tolower(static_cast<unsigned char>(c)));
-  return text;
 }
 
 std::string UrlPart(CURLU* url, CURLUPart part) {
@@ -175,7 +162,7 @@ size_t OnHeader(char* data, size_t size, size_t count, void* user) {
   if (line.compare(0, 5, "HTTP/") == 0) {  // a new response (after 1xx, a new block)
     t.location.clear();
     t.responseSeen = true;
-  } else if (line.size() >= 9 && Lower(line.substr(0, 9)) == "location:") {
+  } else if (line.size() >= 9 && Folded(line.substr(0, 9)) == "location:") {
     std::size_t begin = line.find_first_not_of(" \t", 9);
     t.location = begin == std::string::npos ? std::string() : line.substr(begin);
     while (!t.location.empty() && (t.location.back() == ' ' || t.location.back() == '\t'))
@@ -276,7 +263,7 @@ int wxGet(DownloadProgress& dialog, int first, int last, const char* url, const 
 
   std::size_t slash = source.rfind('/');
   const std::string progressMessage =
-      CutMessage("Downloading " + (slash == std::string::npos ? source : source.substr(slash + 1)) + "...");
+      CutUtf8("Downloading " + (slash == std::string::npos ? source : source.substr(slash + 1)) + "...", kMessageLimit);
 
   CurlHandles curl;
   if (curl.easy == nullptr || curl.multi == nullptr) {
@@ -298,7 +285,7 @@ int wxGet(DownloadProgress& dialog, int first, int last, const char* url, const 
     dialog.Update(first, progressMessage);
 
     const std::string address = UrlPart(current.handle, CURLUPART_URL);
-    const std::string scheme = Lower(UrlPart(current.handle, CURLUPART_SCHEME));
+    const std::string scheme = Folded(UrlPart(current.handle, CURLUPART_SCHEME));
     t.http = scheme == "http" || scheme == "https";
     t.bodySeen = t.redirected = t.responseSeen = false;
     t.location.clear();
@@ -340,7 +327,7 @@ int wxGet(DownloadProgress& dialog, int first, int last, const char* url, const 
       Error("ERROR: wxGet can't initialize - ", source);
       return 0;
     }
-    const std::string nextScheme = Lower(UrlPart(next.handle, CURLUPART_SCHEME));
+    const std::string nextScheme = Folded(UrlPart(next.handle, CURLUPART_SCHEME));
     if (nextScheme != "http" && nextScheme != "https") {
       Error("ERROR: wxGet refuses a redirection outside http and https: ", t.location);
       return 0;

@@ -15,8 +15,9 @@
 #include "access/template.h"
 #include "platform/paths.h"
 #include "platform/profile.h"
-#include "shell/settings.h"
-#include "shell/trace.h"
+#include "text/text.h"
+#include "base/settings.h"
+#include "base/trace.h"
 #include "trovlib/trovlib.h"
 
 const char* DocumentServerURL = nullptr;
@@ -29,19 +30,11 @@ constexpr std::size_t kPathCapacity = 260;       // local and reader paths
 constexpr std::size_t kUrlCapacity = 512;        // server URL
 constexpr std::size_t kExtensionCapacity = 32;
 constexpr int kExpectedSize = 16777216;          // what counts as the whole progress range
-constexpr const char* kDocumentCategory = "TeX system documentation";
 constexpr const char* kCachePattern = "?<$VARTEX\\doc\\>";
 
 std::string& ServerURLStorage() {
   static std::string storage;
   return storage;
-}
-
-bool ContainsIgnoringCase(const std::string& text, const char* word) {
-  std::size_t length = std::strlen(word);
-  for (std::size_t i = 0; i + length <= text.size(); ++i)
-    if (strncasecmp(text.c_str() + i, word, length) == 0) return true;
-  return false;
 }
 
 // A relative name that climbs out of the directory it is appended to.
@@ -171,7 +164,7 @@ int OpenDocumentFile(AccessServices& services, const char* fileName, const char*
   const std::string relativeName = name;
 
   if (!Is_Absolute_Path(name.c_str())) {
-    const char* found = TrovSearch(kDocumentCategory, relativeName.c_str());
+    const char* found = TrovSearch(kDocumentationCategory, relativeName.c_str());
     if (found != nullptr) {
       std::string path(found);
       if (access(path.c_str(), F_OK) != 0) {
@@ -224,7 +217,7 @@ int OpenDocumentFile(AccessServices& services, const char* fileName, const char*
   TemplateCommand command;
   bool haveCommand = false;
 
-  if (hasAnchor && strcasecmp(extension.c_str(), "PDF") == 0) {
+  if (hasAnchor && CompareIgnoringCase(extension.c_str(), "PDF") == 0) {
     std::string reader = services.FindExecutable(name);
     if (!reader.empty() && TooLong(reader, kPathCapacity, "ERROR: PDF reader path too long: "))
       reader.clear();

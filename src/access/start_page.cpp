@@ -5,7 +5,7 @@
 
 #include "access/opendoc.h"
 #include "access/services.h"
-#include "shell/trace.h"
+#include "base/trace.h"
 
 namespace {
 

@@ -1,7 +1,7 @@
 // Opening templates: expansion by the Root setting and the command grammar.
 #include "access/template.h"
 
-#include "shell/trace.h"
+#include "base/trace.h"
 
 std::string ExpandTemplateRoot(const std::string& tmpl, const std::string& root) {
   std::string out;

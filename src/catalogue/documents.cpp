@@ -14,8 +14,9 @@
 
 #include "catalogue/keywords.h"
 #include "platform/profile.h"
-#include "shell/settings.h"
-#include "shell/trace.h"
+#include "text/text.h"
+#include "base/settings.h"
+#include "base/trace.h"
 #include "trovlib/trovlib.h"
 #include "wordindex/wordindex.h"
 
@@ -24,18 +25,10 @@ int DocumentCount = 0;
 
 namespace {
 
-constexpr const char* kDocumentCategory = "TeX system documentation";
 constexpr unsigned long kKeyListSize = 32000;
 constexpr unsigned long kValueSize = 64;
 constexpr unsigned long kSearchFlagSize = 32;
 constexpr const char* kTableFullMessage = "ERROR: Too many documents when try to add: ";
-
-std::string Folded(const std::string& text) {
-  std::string folded(text);
-  for (char& c : folded)
-    if (c >= 'A' && c <= 'Z') c = static_cast<char>(c - 'A' + 'a');
-  return folded;
-}
 
 std::string NameLanguageKey(const std::string& name, const std::string& language) {
   return Folded(name) + '\0' + Folded(language);
@@ -192,7 +185,7 @@ void Collect_Documents() {
     GetPrivateProfileStringA("DOC", key, "", value, sizeof value, IniFilePath.c_str());
     if (value[0] == '\0') continue;
 
-    const char* found = TrovSearch(kDocumentCategory, value);
+    const char* found = TrovSearch(kDocumentationCategory, value);
     if (found == nullptr) {
       if (TraceMode != 0) TraceMessage(value);
       continue;

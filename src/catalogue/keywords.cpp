@@ -9,14 +9,14 @@
 
 #include "catalogue/documents.h"
 #include "catalogue/pool.h"
+#include "text/text.h"
 #include "platform/profile.h"
-#include "shell/settings.h"
-#include "shell/trace.h"
+#include "base/settings.h"
+#include "base/trace.h"
 #include "trovlib/trovlib.h"
 
 namespace {
 
-constexpr const char* kDocumentCategory = "TeX system documentation";
 constexpr const char* kKeywordsSection = "Keywords";
 constexpr unsigned long kKeyListSize = 32000;
 constexpr unsigned long kValueSize = 128;
@@ -35,10 +35,6 @@ int HexValue(unsigned char c) {
   if (c >= 'a' && c <= 'f') return c - 'a' + 10;
   if (c >= 'A' && c <= 'F') return c - 'A' + 10;
   return 0;
-}
-
-unsigned char FoldCase(unsigned char c) {
-  return (c >= 'A' && c <= 'Z') ? static_cast<unsigned char>(c - 'A' + 'a') : c;
 }
 
 // A NUL-terminated copy of `text` in pool memory, or NULL.
@@ -80,17 +76,6 @@ std::size_t DecodeKeyword(const char* key, char* out, std::size_t size) {
   return n;
 }
 
-int CompareIgnoringCase(const char* a, const char* b) {
-  const unsigned char* x = reinterpret_cast<const unsigned char*>(a);
-  const unsigned char* y = reinterpret_cast<const unsigned char*>(b);
-  for (;; ++x, ++y) {
-    const unsigned char cx = FoldCase(*x);
-    const unsigned char cy = FoldCase(*y);
-    if (cx != cy) return cx < cy ? -1 : 1;
-    if (cx == '\0') return 0;
-  }
-}
-
 std::string DefinitionFileName(const char* fileName) {
   std::string name(fileName, strnlen(fileName, kFileNameBufferSize - 1));
   // Only a dot of the file's own name starts an extension; one in a
@@ -110,7 +95,7 @@ int Load_Document_Index(int documentIndex, int loadKeys) {
   if (TraceMode != 0) TraceMessage("INFO: Load_Document_Index - ", shown.c_str());
 
   const std::string ddfName = DefinitionFileName(entry.FileName.c_str());
-  const char* found = TrovSearch(kDocumentCategory, ddfName.c_str());
+  const char* found = TrovSearch(kDocumentationCategory, ddfName.c_str());
   if (found == nullptr) return 0;
   const std::string path(found);  // the library's string does not last
 

@@ -29,9 +29,6 @@ extern KeywordNode KeywordListEnd;
 // and returns the decoded length (which may include NUL bytes).
 std::size_t DecodeKeyword(const char* key, char* out, std::size_t size);
 
-// ASCII letters folded to lower case, then unsigned bytes.
-int CompareIgnoringCase(const char* a, const char* b);
-
 // The definition file's name for a document file name: cut at the last "."
 // of the file's own name (not of a directory) and ".ddf" appended.
 // The file name is first cut to 127 bytes.

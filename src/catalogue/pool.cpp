@@ -6,7 +6,7 @@
 #include <memory>
 #include <new>
 
-#include "shell/trace.h"
+#include "base/trace.h"
 
 namespace {
 

@@ -9,7 +9,7 @@
 #include <unordered_map>
 
 #include "catalogue/documents.h"
-#include "catalogue/keywords.h"
+#include "text/text.h"
 
 namespace {
 
@@ -44,13 +44,6 @@ struct ChildKeyHash {
 };
 bool g_building = false;
 std::unordered_map<ChildKey, Item, ChildKeyHash> g_children;
-
-std::string Folded(const std::string& text) {
-  std::string folded(text);
-  for (char& c : folded)
-    if (c >= 'A' && c <= 'Z') c = static_cast<char>(c - 'A' + 'a');
-  return folded;
-}
 
 bool SameName(const std::string& a, const std::string& b) {
   return CompareIgnoringCase(a.c_str(), b.c_str()) == 0;

@@ -17,6 +17,7 @@
 #include <mutex>
 #include <thread>
 
+#include "text/wxtext_gui.h"
 #include "command/server_gui.h"
 #include "trovlib/trovlib.h"
 
@@ -212,7 +213,7 @@ int SendCommand(const char* command, const std::string& socketPath) {
   // An execute is written at once; only a server whose queue is full could
   // hold it, and the watchdog bounds that too.
   watchdog.Arm();
-  client->m_commandConnection->Execute(wxString(text, wxConvLocal));
+  client->m_commandConnection->Execute(ToWx(text));
   client.reset();
   watchdog.Disarm();
   return 1;

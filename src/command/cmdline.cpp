@@ -7,8 +7,9 @@
 #include "catalogue/documents.h"
 #include "catalogue/keywords.h"
 #include "command/command.h"
-#include "shell/settings.h"
-#include "shell/trace.h"
+#include "base/settings.h"
+#include "base/trace.h"
+#include "text/text.h"
 #include "trovlib/trovlib.h"
 
 namespace {
@@ -39,16 +40,6 @@ std::string NarrowArgument(const wchar_t* wide) {
   return narrow;
 }
 
-// Length of the longest prefix of `text` within `limit` bytes that does not
-// end inside a UTF-8 sequence.
-std::size_t CutAtCharacter(const std::string& text, std::size_t limit) {
-  if (text.size() <= limit) return text.size();
-  std::size_t cut = limit;
-  // Step back over continuation bytes to the start of the cut character.
-  while (cut > 0 && (static_cast<unsigned char>(text[cut]) & 0xC0) == 0x80) --cut;
-  return cut;
-}
-
 }  // namespace
 
 const char* Command_Line(int argc, const wchar_t* const* argv) {
@@ -69,7 +60,7 @@ const char* Command_Line(int argc, const wchar_t* const* argv) {
     const std::string note = "command line of " + std::to_string(line.size()) +
                              " characters cut to " + std::to_string(kCommandLineLimit);
     TrovMessage("WARNING: Command_Line ", note.c_str(), 4);
-    line.resize(CutAtCharacter(line, kCommandLineLimit));
+    line.resize(Utf8CutLength(line, kCommandLineLimit));
   }
 
   g_commandLine = line;

@@ -23,7 +23,7 @@
 
 #include "platform/paths.h"
 #include "shell/app.h"
-#include "shell/log_gui.h"
+#include "text/wxtext_gui.h"
 #include "trovlib/trovlib.h"
 #include "window/frame.h"
 #include "window/panel.h"
@@ -283,7 +283,7 @@ bool MyServer::Create(const wxString& socketPath) {
 }
 
 wxConnectionBase* MyServer::OnAcceptConnection(const wxString& topic) {
-  Message("INFO: DDE server OnAcceptConnection ", NarrowText(topic));
+  Message("INFO: DDE server OnAcceptConnection ", FromWx(topic));
   if (topic != kCommandTopic) {
     Message("ERROR: DDE server ", "Unknown topic, connection refused", 5);
     return nullptr;
@@ -321,7 +321,7 @@ MyConnection::MyConnection(MyServer* server) : server_(server) {}
 MyConnection::~MyConnection() = default;
 
 bool MyConnection::OnExec(const wxString&, const wxString& data) {
-  const std::string command = NarrowText(data);
+  const std::string command = FromWx(data);
   Message("INFO: DDE server Execute ", command);
   RunOrDefer(command);
   return true;
@@ -346,10 +346,10 @@ const void* MyConnection::OnRequest(const wxString&, const wxString& item, size_
     *size = 3;
   }
   if (*size == 0) {
-    Message("ERROR: DDE server Unknown requestOnExecute ", NarrowText(item));
+    Message("ERROR: DDE server Unknown requestOnExecute ", FromWx(item));
     return nullptr;
   }
-  const std::string bytes = NarrowText(reply);
+  const std::string bytes = FromWx(reply);
   m_replyBuffer = wxCharBuffer(bytes.size());
   std::memcpy(m_replyBuffer.data(), bytes.c_str(), bytes.size() + 1);
   if (*size == 1) *size = bytes.size() + 1;  // the terminating NUL is counted
@@ -363,20 +363,20 @@ bool MyConnection::OnPoke(const wxString&, const wxString&, const void*, size_t,
 }
 
 bool MyConnection::OnStartAdvise(const wxString&, const wxString& item) {
-  Message("INFO: DDE server OnStartAdvise ", NarrowText(item));
+  Message("INFO: DDE server OnStartAdvise ", FromWx(item));
   m_adviseItem = item;
   return true;
 }
 
 bool MyConnection::OnStopAdvise(const wxString&, const wxString& item) {
-  Message("INFO: DDE server OnStopAdvise ", NarrowText(item));
+  Message("INFO: DDE server OnStopAdvise ", FromWx(item));
   m_adviseItem.clear();
   return true;
 }
 
 bool MyConnection::DoAdvise(const wxString& item, const void* data, size_t size,
                             wxIPCFormat format) {
-  Message("INFO: DDE server Advice ", NarrowText(item));
+  Message("INFO: DDE server Advice ", FromWx(item));
   return wxConnection::DoAdvise(item, data, size, format);
 }
 

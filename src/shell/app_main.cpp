@@ -18,11 +18,12 @@
 #include "command/command.h"
 #include "command/server_gui.h"
 #include "platform/instance_lock.h"
-#include "platform/window_activation_gui.h"
+#include "platform/window_activation.h"
 #include "shell/app.h"
-#include "shell/log_gui.h"
-#include "shell/settings.h"
-#include "shell/trace.h"
+#include "shell/log.h"
+#include "base/settings.h"
+#include "base/trace.h"
+#include "text/wxtext_gui.h"
 #include "trovlib/trovlib.h"
 #include "window/frame.h"
 #include "window/panel.h"
@@ -122,7 +123,7 @@ bool MyApp::OnInit() {
   Docuvane_Init();
 
   Phase("Frame ...");
-  MyFrame* frame = new MyFrame(wxString(AppTitle, wxConvLocal));
+  MyFrame* frame = new MyFrame(ToWx(AppTitle));
   MainFrame = frame;
   SetTopWindow(frame);
   // The command channel reaches the frame through MainFrame: forget it

@@ -258,7 +258,7 @@ const char* TrovSearch(const char* spec, const char* name) {
     bool rank_sizes;
   };
   std::vector<Group> groups;
-  if (category == "TeX system documentation") {
+  if (category == kDocumentationCategory) {
     groups.push_back({{}, false, false});
     AddPatternRoots("$TEXMF/doc//", groups.back().roots);
   } else if (program) {

@@ -8,6 +8,9 @@
 
 #include <functional>
 
+// The search category of installed documents, ".ddf" files and the word index.
+constexpr const char* kDocumentationCategory = "TeX system documentation";
+
 // Full path of `name` found through `spec` (a category name or a path
 // pattern), or NULL.
 const char* TrovSearch(const char* spec, const char* name);

@@ -10,8 +10,9 @@
 #include <cctype>
 #include <string>
 
-#include "shell/app.h"
+#include "text/wxtext_gui.h"
 #include "trovlib/trovlib.h"
+#include "window/frame.h"
 #include "window/picture.h"
 
 namespace {
@@ -40,7 +41,7 @@ AboutDlg::AboutDlg(wxWindow* parent)
   }
   column->AddSpacer(kGap);
 
-  wxStaticText* title = CentredText(this, wxString(AppTitle, wxConvLocal));
+  wxStaticText* title = CentredText(this, ToWx(AppTitle));
   title->SetFont(GetFont().Bold());
   title->SetForegroundColour(wxColour(128, 0, 128));
   column->Add(title, 0, wxALIGN_CENTRE_HORIZONTAL);

@@ -13,12 +13,14 @@
 #include "access/desktop_services_gui.h"
 #include "catalogue/documents.h"
 #include "docuvane_icons.h"
-#include "shell/trace.h"
+#include "base/trace.h"
 #include "trovlib/trovlib.h"
 #include "window/about.h"
 #include "window/ids.h"
 #include "window/panel.h"
 #include "wordindex/wordlist.h"
+
+const char* AppTitle = "Lomari Docuvane";
 
 namespace {
 

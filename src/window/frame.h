@@ -5,6 +5,9 @@
 #include <wx/frame.h>
 #include <wx/gdicmn.h>
 
+// "Lomari Docuvane": the main frame's title, shown by the About dialog too.
+extern const char* AppTitle;
+
 class Docuvane;
 class wxConfigBase;
 

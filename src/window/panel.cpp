@@ -17,10 +17,11 @@
 #include <cstdio>
 #include <string>
 
+#include "text/wxtext_gui.h"
 #include "trovlib/trovlib.h"
 #include "window/picture.h"
 #include "window/ids.h"
-#include "wordindex/qlistbox_gui.h"
+#include "window/qlistbox.h"
 
 namespace {
 
@@ -145,10 +146,10 @@ wxButton* Docuvane::MakeIconButton(wxWindow* parent, int id, const char* label, 
     button = new wxBitmapButton(parent, id, bitmap, wxDefaultPosition, size, wxBU_AUTODRAW,
                                 wxDefaultValidator, "button");
   } else {
-    button = new wxButton(parent, id, wxString(label, wxConvLocal), wxDefaultPosition, wxDefaultSize, 0,
+    button = new wxButton(parent, id, ToWx(label), wxDefaultPosition, wxDefaultSize, 0,
                           wxDefaultValidator, "button");
   }
-  if (button && toolTip && *toolTip) button->SetToolTip(wxString(toolTip, wxConvLocal));
+  if (button && toolTip && *toolTip) button->SetToolTip(ToWx(toolTip));
   return button;
 }
 

@@ -4,10 +4,11 @@
 #include <wx/treectrl.h>
 
 #include "access/opendoc_gui.h"
+#include "text/wxtext_gui.h"
 #include "catalogue/tree.h"
 #include "command/command.h"
 #include "window/panel.h"
-#include "wordindex/qlistbox_gui.h"
+#include "window/qlistbox.h"
 
 namespace {
 
@@ -17,7 +18,7 @@ class PanelCommands : public CommandPanel {
   bool HasSearchControl() override { return panel_->m_search != nullptr; }
   void SetSearchValue(const std::string& text) override {
     // SetValue, unlike ChangeValue, sends the text event that runs OnSearch.
-    panel_->m_search->SetValue(wxString(text.c_str(), wxConvLocal));
+    panel_->m_search->SetValue(ToWx(text));
   }
   bool HasWordList() override { return panel_->m_wordList != nullptr; }
   int FindWord(const char* text, int exact) override {
@@ -44,9 +45,9 @@ class TreeCtrlView : public DocumentTreeView {
   void Thaw() override { tree_->Thaw(); }
   void DeleteAllItems() override { tree_->DeleteAllItems(); }
   Item GetRootItem() override { return tree_->GetRootItem().GetID(); }
-  Item AddRoot(const std::string& text) override { return tree_->AddRoot(ToDisplay(text)).GetID(); }
+  Item AddRoot(const std::string& text) override { return tree_->AddRoot(ToWx(text)).GetID(); }
   Item AppendItem(Item parent, const std::string& text) override {
-    return tree_->AppendItem(wxTreeItemId(parent), ToDisplay(text)).GetID();
+    return tree_->AppendItem(wxTreeItemId(parent), ToWx(text)).GetID();
   }
   Item GetFirstChild(Item parent) override {
     wxTreeItemIdValue cookie;
@@ -55,22 +56,9 @@ class TreeCtrlView : public DocumentTreeView {
   Item GetNextChild(Item, Item previous) override {
     return tree_->GetNextSibling(wxTreeItemId(previous)).GetID();
   }
-  std::string GetItemText(Item item) override {
-    const wxString text = tree_->GetItemText(wxTreeItemId(item));
-    wxCharBuffer narrow = text.mb_str(wxConvLocal);
-    if (narrow.data() && (narrow.length() || text.empty())) return std::string(narrow.data(), narrow.length());
-    wxCharBuffer latin = text.mb_str(wxConvISO8859_1);
-    return latin.data() ? std::string(latin.data(), latin.length()) : std::string();
-  }
+  std::string GetItemText(Item item) override { return FromWx(tree_->GetItemText(wxTreeItemId(item))); }
 
  private:
-  // A name that is not valid in the locale's encoding is shown byte for byte
-  // rather than as an empty node.
-  static wxString ToDisplay(const std::string& text) {
-    wxString shown(text.c_str(), wxConvLocal);
-    if (shown.empty() && !text.empty()) shown = wxString(text.c_str(), wxConvISO8859_1);
-    return shown;
-  }
   wxTreeCtrl* tree_;
 };
 

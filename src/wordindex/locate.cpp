@@ -3,7 +3,7 @@
 #include "wordindex/locate.h"
 
 #include "platform/paths.h"
-#include "shell/trace.h"
+#include "base/trace.h"
 #include "trovlib/trovlib.h"
 
 std::string WordIndexPath;
@@ -19,7 +19,7 @@ const std::string& LocateWordIndex() {
   if (!WordIndexPath.empty()) return WordIndexPath;
 
   const char* found = TrovSearch("${TEXDIR}/Update", kWordIndexName);
-  if (found == nullptr) found = TrovSearch("TeX system documentation", kWordIndexName);
+  if (found == nullptr) found = TrovSearch(kDocumentationCategory, kWordIndexName);
   if (found == nullptr) {
     WordIndexPath.clear();
     TraceMessage("Document Word Index File: ", "NOT FOUND");

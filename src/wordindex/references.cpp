@@ -7,7 +7,8 @@
 
 #include "catalogue/documents.h"
 #include "catalogue/keywords.h"
-#include "shell/trace.h"
+#include "text/text.h"
+#include "base/trace.h"
 #include "wordindex/wordindex.h"
 
 int LoadWordReferences(int32_t offset, const char* word, std::vector<std::string>& items) {

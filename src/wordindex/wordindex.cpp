@@ -5,7 +5,7 @@
 #include <string>
 #include <vector>
 
-#include "shell/trace.h"
+#include "base/trace.h"
 
 FILE* WordIndexHandle = nullptr;
 int MinWordLength = 0;

@@ -6,7 +6,8 @@
 #include <cstring>
 
 #include "platform/paths.h"
-#include "shell/trace.h"
+#include "base/trace.h"
+#include "text/text.h"
 #include "wordindex/wordindex.h"
 
 int CommandWordCount = 0;
@@ -14,22 +15,7 @@ int EnvironmentWordCount = 0;
 
 namespace {
 
-inline unsigned char Fold(unsigned char c) {
-  return (c >= 'A' && c <= 'Z') ? static_cast<unsigned char>(c + ('a' - 'A')) : c;
-}
-
 inline const char* DropLead(const char* w) { return (*w == '\\' || *w == '{') ? w + 1 : w; }
-
-inline int CompareFolded(const char* a, const char* b) {
-  const unsigned char* x = reinterpret_cast<const unsigned char*>(a);
-  const unsigned char* y = reinterpret_cast<const unsigned char*>(b);
-  for (;; ++x, ++y) {
-    const unsigned char cx = Fold(*x);
-    const unsigned char cy = Fold(*y);
-    if (cx != cy) return cx < cy ? -1 : 1;
-    if (cx == 0) return 0;
-  }
-}
 
 // True when the first n bytes of `word` equal `text` ignoring case (and
 // `word` is at least that long).
@@ -37,7 +23,7 @@ bool StartsWithFolded(const char* word, const char* text, std::size_t n) {
   for (std::size_t i = 0; i < n; ++i) {
     const unsigned char w = static_cast<unsigned char>(word[i]);
     if (w == 0) return false;
-    if (Fold(w) != Fold(static_cast<unsigned char>(text[i]))) return false;
+    if (FoldCase(w) != FoldCase(static_cast<unsigned char>(text[i]))) return false;
   }
   return true;
 }
@@ -45,7 +31,7 @@ bool StartsWithFolded(const char* word, const char* text, std::size_t n) {
 }  // namespace
 
 int CompareIndexWords(const char* a, const char* b) {
-  return CompareFolded(DropLead(a), DropLead(b));
+  return CompareIgnoringCase(DropLead(a), DropLead(b));
 }
 
 int Fill_WordIndex(WordListData& data) {
@@ -93,7 +79,7 @@ int Fill_WordIndex(WordListData& data) {
   }
 
   std::sort(data.Words.begin(), data.Words.end(), [](const char* a, const char* b) {
-    return CompareFolded(DropLead(a), DropLead(b)) < 0;
+    return CompareIgnoringCase(DropLead(a), DropLead(b)) < 0;
   });
 
   char elapsed[32];

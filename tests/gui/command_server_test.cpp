@@ -21,7 +21,7 @@
 #include <vector>
 
 #include "command/server_gui.h"
-#include "shell/log_gui.h"
+#include "shell/log.h"
 #include "test_support.h"
 
 namespace {

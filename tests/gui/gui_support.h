@@ -14,7 +14,7 @@
 #include "catalogue/keywords.h"
 #include "catalogue/pool.h"
 #include "platform/profile.h"
-#include "shell/settings.h"
+#include "base/settings.h"
 #include "test_support.h"  // also filesystem, fstream, optional, string, vector
 #include "window/frame.h"
 #include "window/panel.h"

@@ -12,7 +12,7 @@
 #include "gui_support.h"
 #include "window/about.h"
 #include "window/ids.h"
-#include "wordindex/qlistbox_gui.h"
+#include "window/qlistbox.h"
 
 namespace gui_testing {
 namespace {

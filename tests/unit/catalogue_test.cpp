@@ -16,7 +16,7 @@
 #include "catalogue/pool.h"
 #include "catalogue/tree.h"
 #include "platform/profile.h"
-#include "shell/settings.h"
+#include "base/settings.h"
 #include "test_support.h"
 #include "trovlib/trovlib.h"
 #include "wordindex/wordindex.h"

@@ -9,7 +9,8 @@
 
 #include "catalogue/documents.h"
 #include "catalogue/keywords.h"
-#include "shell/settings.h"
+#include "text/text.h"
+#include "base/settings.h"
 #include "test_support.h"
 
 namespace {

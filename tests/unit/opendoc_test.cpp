@@ -17,7 +17,7 @@
 
 #include "fake_access_services.h"
 #include "platform/profile.h"
-#include "shell/settings.h"
+#include "base/settings.h"
 #include "test_support.h"
 
 extern char** environ;

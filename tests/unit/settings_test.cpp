@@ -1,5 +1,5 @@
 // Tracing, and Docuvane_Init: the private INI file, its Setup values, the word index.
-#include "shell/settings.h"
+#include "base/settings.h"
 
 #include <gtest/gtest.h>
 
@@ -9,7 +9,7 @@
 #include <string>
 
 #include "platform/profile.h"
-#include "shell/trace.h"
+#include "base/trace.h"
 #include "test_support.h"
 #include "wordindex/locate.h"
 #include "wordindex/wordindex.h"

@@ -1,5 +1,5 @@
 // The program's free-form trace.
-#include "shell/trace.h"
+#include "base/trace.h"
 
 #include <algorithm>
 #include <cstring>

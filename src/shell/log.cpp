@@ -1,21 +1,10 @@
 // The framework's log target and application traits.
-#include "shell/log_gui.h"
+#include "shell/log.h"
 
 #include <string>
 
+#include "text/wxtext_gui.h"
 #include "trovlib/trovlib.h"
-
-std::string NarrowText(const wxString& text) {
-  const wxCharBuffer local = text.mb_str(wxConvLibc);
-  if (local.data() != nullptr && (local.length() != 0 || text.empty()))
-    return std::string(local.data(), local.length());
-  const wxScopedCharBuffer utf8 = text.utf8_str();
-  return std::string(utf8.data(), utf8.length());
-}
-
-namespace {
-
-}  // namespace
 
 LogRoute RouteOfLogLevel(wxLogLevel level) {
   switch (level) {
@@ -32,14 +21,14 @@ LogRoute RouteOfLogLevel(wxLogLevel level) {
 void MyLogGui::DoLogTextAtLevel(wxLogLevel level, const wxString& msg) {
   const LogRoute route = RouteOfLogLevel(level);
   const std::string prefix = std::string("Docuvane") + "-" + route.tag;
-  TrovMessage(prefix.c_str(), NarrowText(msg).c_str(), route.level);
+  TrovMessage(prefix.c_str(), FromWx(msg).c_str(), route.level);
 }
 
 wxLog* MyAppTraits::CreateLogTarget() { return new MyLogGui; }
 
 bool MyAppTraits::ShowAssertDialog(const wxString& msg) {
   const std::string prefix = std::string("Docuvane") + "-Assert: ";
-  TrovMessage(prefix.c_str(), NarrowText(msg).c_str(), 260);
+  TrovMessage(prefix.c_str(), FromWx(msg).c_str(), 260);
   // No dialog, and later assertions are not suppressed.
   return false;
 }

@@ -10,11 +10,13 @@
 #include <vector>
 
 #include "access/opendoc_gui.h"
+#include "text/wxtext_gui.h"
 #include "catalogue/documents.h"
 #include "catalogue/keywords.h"
+#include "text/text.h"
 #include "trovlib/trovlib.h"
 #include "window/panel.h"
-#include "wordindex/qlistbox_gui.h"
+#include "window/qlistbox.h"
 #include "wordindex/references.h"
 #include "wordindex/wordindex.h"
 
@@ -22,25 +24,10 @@ wxTreeItemId HighlightedItem;
 
 namespace {
 
-// Location texts are 8-bit in the locale's encoding; a text that does not
-// convert (a stray byte in a label) is shown byte for byte rather than lost.
-wxString ToDisplay(const std::string& text) {
-  wxString shown(text.c_str(), wxConvLocal);
-  if (shown.empty() && !text.empty()) shown = wxString(text.c_str(), wxConvISO8859_1);
-  return shown;
-}
-
-std::string FromDisplay(const wxString& text) {
-  wxCharBuffer narrow = text.mb_str(wxConvLocal);
-  if (narrow.data() && (narrow.length() || text.empty())) return std::string(narrow.data(), narrow.length());
-  wxCharBuffer latin = text.mb_str(wxConvISO8859_1);
-  return latin.data() ? std::string(latin.data(), latin.length()) : std::string();
-}
-
 std::string SelectedLocation(Docuvane* panel, int* row) {
   *row = panel->m_targetList ? panel->m_targetList->GetSelection() : wxNOT_FOUND;
   if (*row == wxNOT_FOUND) return std::string();
-  return FromDisplay(panel->m_targetList->GetString(static_cast<unsigned>(*row)));
+  return FromWx(panel->m_targetList->GetString(static_cast<unsigned>(*row)));
 }
 
 }  // namespace
@@ -60,7 +47,7 @@ void Show_Topic(Docuvane* panel, const char* word, int openIfSingle) {
   const KeywordTargets targets = CollectKeywordTargets(word);
   if (locations && !targets.items.empty()) {
     wxArrayString texts;
-    for (const std::string& item : targets.items) texts.Add(ToDisplay(item));
+    for (const std::string& item : targets.items) texts.Add(ToWx(item));
     locations->Append(texts);
     // Selecting in code sends no event: "&Go To" waits for the user's choice.
     locations->SetSelection(0);
@@ -75,7 +62,7 @@ void Show_Topic(Docuvane* panel, const char* word, int openIfSingle) {
       LoadWordReferences(offset, word, items);
       if (locations && !items.empty()) {
         wxArrayString texts;
-        for (const std::string& item : items) texts.Add(ToDisplay(item));
+        for (const std::string& item : items) texts.Add(ToWx(item));
         locations->Append(texts);
       }
     }
@@ -107,7 +94,7 @@ void HighlightDocument(Docuvane* panel, const char* text) {
 
 void Docuvane::OnSearch(wxCommandEvent&) {
   if (!m_search) return;
-  const std::string text = FromDisplay(m_search->GetValue());
+  const std::string text = FromWx(m_search->GetValue());
   TrovMessage("INFO: Docuvane::OnSearch of ", text.c_str(), 3);
   if (text.empty() || !m_wordList) return;
   const int row = FindWordInList(m_wordList, text.c_str(), 0);

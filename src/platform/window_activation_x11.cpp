@@ -1,5 +1,5 @@
 // Window activation on X11.
-#include "platform/window_activation_gui.h"
+#include "platform/window_activation.h"
 
 #include <X11/Xatom.h>
 #include <X11/Xlib.h>

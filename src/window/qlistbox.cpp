@@ -1,5 +1,5 @@
 // The word list control: loading through Fill_WordIndex, fixed-height rows.
-#include "wordindex/qlistbox_gui.h"
+#include "window/qlistbox.h"
 
 #include <wx/dc.h>
 #include <wx/dcscreen.h>

@@ -1,5 +1,5 @@
 // Docuvane_Init: the private INI file's Setup section and the word index.
-#include "shell/settings.h"
+#include "base/settings.h"
 
 #include <climits>
 #include <cstdlib>
@@ -8,7 +8,7 @@
 
 #include "platform/paths.h"
 #include "platform/profile.h"
-#include "shell/trace.h"
+#include "base/trace.h"
 #include "trovlib/trovlib.h"
 #include "wordindex/locate.h"
 #include "wordindex/wordindex.h"

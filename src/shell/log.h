@@ -7,10 +7,6 @@
 
 #include <string>
 
-// Framework text in the locale's 8-bit encoding; text the locale cannot
-// express goes out as UTF-8 rather than as nothing.
-std::string NarrowText(const wxString& text);
-
 class MyLogGui : public wxLog {
  protected:
   void DoLogTextAtLevel(wxLogLevel level, const wxString& msg) override;
