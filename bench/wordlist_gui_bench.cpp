@@ -34,6 +34,7 @@
 #include "catalogue/pool.h"
 #include "platform/profile.h"
 #include "base/settings.h"
+#include "wordindex/locate.h"
 #include "test_support.h"
 #include "trovlib/trovlib.h"
 #include "window/frame.h"
@@ -138,7 +139,7 @@ int RunChild(int argc, char** argv, bool docuvane) {
     wxTheApp->SetVendorName("Lomari");
     wxInitAllImageHandlers();
     wxConfigBase::Get();
-    Docuvane_Init();
+    Docuvane_Init(OpenInstalledWordIndex);
     frame = new MyFrame("Lomari Docuvane");
   } else {
     frame = new wxFrame(nullptr, wxID_ANY, "Empty");

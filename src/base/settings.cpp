@@ -10,8 +10,6 @@
 #include "platform/profile.h"
 #include "base/trace.h"
 #include "trovlib/trovlib.h"
-#include "wordindex/locate.h"
-#include "wordindex/wordindex.h"
 
 std::string IniFilePath;
 int TraceMode = 0;
@@ -54,7 +52,7 @@ std::string FormatRootValue(const char* value, const char* argument) {
   return out;
 }
 
-int Docuvane_Init() {
+int Docuvane_Init(void (*openWordIndex)()) {
   TraceMessage("Docuvane_Init --- ", "Start");
 
   if (const char* found = TrovSearch("$TEXMF/Docuvane//", "Docuvane.ini")) {
@@ -72,9 +70,7 @@ int Docuvane_Init() {
   GetPrivateProfileStringA("Setup", "Root", "", value, sizeof value, IniFilePath.c_str());
   if (value[0] != '\0') RootPath = FormatRootValue(value, RootPath.c_str());
 
-  LocateWordIndex();
-  TraceMessage("Docuvane_Init --- WXFileName=", WordIndexPath.c_str());
-  if (!WordIndexPath.empty()) OpenWordIndex(WordIndexPath.c_str());
+  if (openWordIndex != nullptr) openWordIndex();
 
   TraceMessage("Docuvane --- ", "End");
   return 1;

@@ -27,6 +27,7 @@
 #include "trovlib/trovlib.h"
 #include "window/frame.h"
 #include "window/panel.h"
+#include "wordindex/locate.h"
 
 namespace {
 
@@ -120,7 +121,7 @@ bool MyApp::OnInit() {
   Phase("Command_Line");
   const std::string commandLine = Command_Line(argc, argv);
 
-  Docuvane_Init();
+  Docuvane_Init(OpenInstalledWordIndex);
 
   Phase("Frame ...");
   MyFrame* frame = new MyFrame(ToWx(AppTitle));

@@ -5,6 +5,7 @@
 #include "platform/paths.h"
 #include "base/trace.h"
 #include "trovlib/trovlib.h"
+#include "wordindex/wordindex.h"
 
 std::string WordIndexPath;
 
@@ -36,4 +37,10 @@ const std::string& LocateWordIndex() {
   TraceMessage("Document Word Index File: ",
                WordIndexPath.empty() ? "NOT FOUND" : WordIndexPath.c_str());
   return WordIndexPath;
+}
+
+void OpenInstalledWordIndex() {
+  LocateWordIndex();
+  TraceMessage("Docuvane_Init --- WXFileName=", WordIndexPath.c_str());
+  if (!WordIndexPath.empty()) OpenWordIndex(WordIndexPath.c_str());
 }

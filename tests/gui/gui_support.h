@@ -119,7 +119,7 @@ class WindowTest : public ::testing::Test {
 
   // Builds the frame as start-up does and shows it.
   void OpenFrame() {
-    Docuvane_Init();
+    Docuvane_Init(OpenInstalledWordIndex);
     frame = new MyFrame("Lomari Docuvane");
     frame->Show();
     WaitFor([this] { return frame->IsShownOnScreen(); });

@@ -37,7 +37,7 @@ class SettingsTest : public ::testing::Test {
     CloseWordIndex();
     WordIndexPath.clear(), IniFilePath.clear(), RootPath.clear();
     TraceMode = 12345;
-    return Docuvane_Init();
+    return Docuvane_Init(OpenInstalledWordIndex);
   }
   TempDir dir_;
   std::list<testing_support::ScopedEnv> env_;
