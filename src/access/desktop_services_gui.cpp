@@ -13,6 +13,7 @@
 #include "access/opendoc_gui.h"
 #include "text/wxtext_gui.h"
 #include "platform/findexec.h"
+#include "platform/winapi.h"
 
 namespace {
 
@@ -73,7 +74,9 @@ bool DesktopAccessServices::LaunchDefaultBrowser(const std::string& url) {
 }
 
 std::string DesktopAccessServices::FindExecutable(const std::string& path) {
-  return ::FindExecutable(path);
+  char reader[260];
+  if (FindExecutableA(path.c_str(), nullptr, reader) <= 32) return std::string();
+  return reader;
 }
 
 int DesktopAccessServices::Download(const std::string& message, const std::string& url,

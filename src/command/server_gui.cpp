@@ -225,8 +225,12 @@ class MyServer::SocketTimeouts : public wxEventFilter {
 };
 
 std::string CommandSocketPath() {
-  const std::string dir = RuntimeDirectory();
-  if (dir.empty()) return std::string();
+  std::string error;
+  const std::string dir = RuntimeDirectory(&error);
+  if (dir.empty()) {
+    TrovMessage("ERROR: RuntimeDirectory ", error.c_str(), 5);
+    return std::string();
+  }
   return dir + "/" + kCommandService;
 }
 

@@ -9,22 +9,22 @@
 #include <cstring>
 
 #include "platform/paths.h"
-#include "trovlib/trovlib.h"
 
 InstanceLock::~InstanceLock() { Release(); }
 
 bool InstanceLock::Create(const std::string& name, const std::string& directory) {
   Release();
   another_ = false;
-  const std::string dir = directory.empty() ? RuntimeDirectory() : directory;
-  if (dir.empty()) return false;  // RuntimeDirectory has said why
+  error_.clear();
+  const std::string dir = directory.empty() ? RuntimeDirectory(&error_) : directory;
+  if (dir.empty()) return false;
   path_ = dir + "/" + name + ".lock";
 
   // O_CLOEXEC: a viewer started by the program must not inherit the lock and
   // keep it after the program ends.  O_NOFOLLOW: never lock through a link.
   const int fd = open(path_.c_str(), O_RDWR | O_CREAT | O_CLOEXEC | O_NOFOLLOW, 0600);
   if (fd < 0) {
-    TrovMessage("ERROR: InstanceLock ", (path_ + ": " + std::strerror(errno)).c_str(), 5);
+    error_ = path_ + ": " + std::strerror(errno);
     return false;
   }
   int rc;
@@ -37,7 +37,7 @@ bool InstanceLock::Create(const std::string& name, const std::string& directory)
     if (error == EWOULDBLOCK) {
       another_ = true;
     } else {
-      TrovMessage("ERROR: InstanceLock ", (path_ + ": " + std::strerror(error)).c_str(), 5);
+      error_ = path_ + ": " + std::strerror(error);
     }
     return false;
   }

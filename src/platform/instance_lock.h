@@ -16,7 +16,7 @@ class InstanceLock {
 
   // Tries to take the lock `name` in `directory` (empty: RuntimeDirectory()).
   // Returns true when this object holds it.  When the lock file cannot be
-  // opened at all, an "ERROR: " message is emitted and false returned;
+  // opened at all, false is returned with the reason in error();
   // IsAnotherRunning() then says false, so that the program still starts.
   bool Create(const std::string& name, const std::string& directory = std::string());
 
@@ -26,6 +26,8 @@ class InstanceLock {
   bool HoldsLock() const { return fd_ >= 0; }
   // Full path of the lock file (empty before Create).
   const std::string& path() const { return path_; }
+  // Why the last Create could not lock at all; empty otherwise.
+  const std::string& error() const { return error_; }
 
   // Releases the lock (the file stays: removing it would let two starts lock
   // two different files).
@@ -35,4 +37,5 @@ class InstanceLock {
   int fd_ = -1;
   bool another_ = false;
   std::string path_;
+  std::string error_;
 };

@@ -13,9 +13,6 @@ char* Fix_Slashes(char* path);
 std::string& Fix_Slashes(std::string& path);
 
 // The per-user runtime directory ($XDG_RUNTIME_DIR/lomari or
-// /tmp/lomari-<uid>), created with mode 0700.  Empty, with an "ERROR: "
-// message, when it exists but is not a private directory of this user.
-std::string RuntimeDirectory();
-
-// A monotonic millisecond clock.
-unsigned long GetTickCount();
+// /tmp/lomari-<uid>), created with mode 0700.  Empty, with the reason in
+// `error`, when it cannot be made or is not a private directory of this user.
+std::string RuntimeDirectory(std::string* error = nullptr);

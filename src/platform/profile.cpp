@@ -245,8 +245,8 @@ std::shared_ptr<const Profile> Load(const std::string& path) {
 
 }  // namespace
 
-unsigned long GetPrivateProfileStringA(const char* section, const char* key, const char* def,
-                                       char* buffer, unsigned long size, const char* file) {
+DWORD GetPrivateProfileStringA(const char* section, const char* key, const char* def, char* buffer,
+                               DWORD size, const char* file) {
   std::shared_ptr<const Profile> profile;
   if (file != nullptr && *file != '\0') profile = Load(ResolvePath(file));
   return Answer(profile.get(), section, key, def, buffer, size);

@@ -9,8 +9,7 @@
 // NUL-terminated, the list ended by an extra NUL, cut to fit.  A missing
 // file, section or key yields `def`.  A bare file name is looked up in
 // /etc/lomari/.
-unsigned long GetPrivateProfileStringA(const char* section, const char* key, const char* def,
-                                       char* buffer, unsigned long size, const char* file);
+#include "platform/winapi.h"  // GetPrivateProfileStringA
 
 // Parsed files are cached by path and modification time; tests that rewrite
 // a file within the same second call this.

@@ -1,5 +1,5 @@
 // Window activation on X11.
-#include "platform/window_activation.h"
+#include "platform/winapi.h"
 
 #include <X11/Xatom.h>
 #include <X11/Xlib.h>
@@ -104,29 +104,32 @@ void SendActivation(Display* display, Window window) {
 
 }  // namespace
 
-bool IsIconic(unsigned long window) {
+BOOL IsIconic(NativeWindow window) {
   XSession x;
   if (x.display() == nullptr || !x.Exists(window)) return false;
   return HasNetWmState(x.display(), window, "_NET_WM_STATE_HIDDEN") ||
          HasIconicWmState(x.display(), window);
 }
 
-void OpenIcon(unsigned long window) {
+BOOL OpenIcon(NativeWindow window) {
   XSession x;
-  if (x.display() == nullptr || !x.Exists(window)) return;
+  if (x.display() == nullptr || !x.Exists(window)) return 0;
   // Window managers de-iconify on activation; without one, mapping does it.
   SendActivation(x.display(), window);
   XMapRaised(x.display(), window);
+  return 1;
 }
 
-void BringWindowToTop(unsigned long window) {
+BOOL BringWindowToTop(NativeWindow window) {
   XSession x;
-  if (x.display() == nullptr || !x.Exists(window)) return;
+  if (x.display() == nullptr || !x.Exists(window)) return 0;
   XRaiseWindow(x.display(), window);
+  return 1;
 }
 
-void SetForegroundWindow(unsigned long window) {
+BOOL SetForegroundWindow(NativeWindow window) {
   XSession x;
-  if (x.display() == nullptr || !x.Exists(window)) return;
+  if (x.display() == nullptr || !x.Exists(window)) return 0;
   SendActivation(x.display(), window);
+  return 1;
 }

@@ -1,7 +1,5 @@
 // Program entry and the application object: one running instance per user;
 // a later start hands its command line to it and ends.
-#include <dlfcn.h>
-#include <unistd.h>
 #include <wx/app.h>
 #include <wx/config.h>
 #include <wx/image.h>
@@ -18,7 +16,8 @@
 #include "command/command.h"
 #include "command/server_gui.h"
 #include "platform/instance_lock.h"
-#include "platform/window_activation.h"
+#include "platform/native_window_gui.h"
+#include "platform/winapi.h"
 #include "shell/app.h"
 #include "shell/log.h"
 #include "base/settings.h"
@@ -34,33 +33,6 @@ namespace {
 const char* const kWindowName = "Docuvane";
 
 void Phase(const char* phase) { TraceMessage("Docuvane::OnInit --- ", phase); }
-
-// The X11 id of a realised top-level window.  GTK is reached through the
-// symbols the framework has already loaded, so that the program needs no
-// GTK headers of its own; 0 when the window lives on another backend.
-unsigned long NativeWindowId(wxWindow* window) {
-  using Realize = void (*)(void*);
-  using GetWindow = void* (*)(void*);
-  using TypeName = const char* (*)(void*);
-  using GetXid = unsigned long (*)(void*);
-  static const auto realize = reinterpret_cast<Realize>(dlsym(RTLD_DEFAULT, "gtk_widget_realize"));
-  static const auto getWindow =
-      reinterpret_cast<GetWindow>(dlsym(RTLD_DEFAULT, "gtk_widget_get_window"));
-  static const auto typeName =
-      reinterpret_cast<TypeName>(dlsym(RTLD_DEFAULT, "g_type_name_from_instance"));
-  static const auto getXid =
-      reinterpret_cast<GetXid>(dlsym(RTLD_DEFAULT, "gdk_x11_window_get_xid"));
-  void* widget = window != nullptr ? static_cast<void*>(window->GetHandle()) : nullptr;
-  if (widget == nullptr || realize == nullptr || getWindow == nullptr || getXid == nullptr ||
-      typeName == nullptr)
-    return 0;
-  realize(widget);
-  void* gdkWindow = getWindow(widget);
-  if (gdkWindow == nullptr) return 0;
-  const char* type = typeName(gdkWindow);
-  if (type == nullptr || std::string(type).find("X11") == std::string::npos) return 0;
-  return getXid(gdkWindow);
-}
 
 }  // namespace
 
@@ -93,9 +65,11 @@ bool MyApp::OnInit() {
   std::snprintf(lockName, sizeof lockName, "Lomari-Docuvane-%s", user.c_str());
   m_checker.reset(new InstanceLock);
   m_checker->Create(lockName);
+  if (!m_checker->error().empty())
+    TrovMessage("ERROR: InstanceLock ", m_checker->error().c_str(), 5);
 
   if (m_checker->IsAnotherRunning()) {
-    if (const unsigned long window = TrovLookupWindow(kWindowName)) {
+    if (const NativeWindow window = TrovLookupWindow(kWindowName)) {
       if (IsIconic(window)) OpenIcon(window);
       BringWindowToTop(window);
       SetForegroundWindow(window);
@@ -106,7 +80,7 @@ bool MyApp::OnInit() {
     // the toolkit's themes first: it costs a later start more than all it
     // has done so far.  The outcome is the same without it.
     std::fflush(nullptr);
-    _exit(255);
+    ExitProcess(255);
   }
 
   wxInitAllImageHandlers();
@@ -134,12 +108,12 @@ bool MyApp::OnInit() {
     event.Skip();
   });
 
-  const unsigned long window = NativeWindowId(frame);
+  const NativeWindow window = NativeWindowOf(frame);
   TrovPublishWindow(kWindowName, window);
   char handle[16];
   std::snprintf(handle, sizeof handle, "%d",
                 static_cast<int>(static_cast<std::uint32_t>(window & 0xFFFFFFFFul)));
-  setenv("LOMARISTERWINDOW", handle, 1);
+  SetEnvironmentVariableA("LOMARISTERWINDOW", handle);
 
   // Only the lock holder may take the socket path over.
   if (m_checker->HoldsLock()) {

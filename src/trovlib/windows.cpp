@@ -29,8 +29,12 @@ std::string RegistryFile(const std::string& runtime, const char* name) {
 
 void TrovPublishWindow(const char* name, unsigned long handle) {
   if (name == nullptr) return;
-  std::string runtime = RuntimeDirectory();
-  if (runtime.empty()) return;
+  std::string error;
+  std::string runtime = RuntimeDirectory(&error);
+  if (runtime.empty()) {
+    TrovMessage("ERROR: RuntimeDirectory ", error.c_str(), 5);
+    return;
+  }
   std::string file = RegistryFile(runtime, name);
   // Written aside and renamed, so that a reader never sees half a number.
   std::string temp = file + ".tmp" + std::to_string(getpid());
@@ -50,8 +54,12 @@ void TrovPublishWindow(const char* name, unsigned long handle) {
 
 unsigned long TrovLookupWindow(const char* name) {
   if (name == nullptr) return 0;
-  std::string runtime = RuntimeDirectory();
-  if (runtime.empty()) return 0;
+  std::string error;
+  std::string runtime = RuntimeDirectory(&error);
+  if (runtime.empty()) {
+    TrovMessage("ERROR: RuntimeDirectory ", error.c_str(), 5);
+    return 0;
+  }
   int fd = open(RegistryFile(runtime, name).c_str(), O_RDONLY | O_CLOEXEC);
   if (fd < 0) return 0;
   char buffer[32];

@@ -10,6 +10,7 @@
 #include <cstdio>
 
 #include "access/start_page.h"
+#include "platform/winapi.h"
 #include "access/desktop_services_gui.h"
 #include "catalogue/documents.h"
 #include "docuvane_icons.h"
@@ -103,6 +104,22 @@ MyFrame::MyFrame(const wxString& title)
                 DocumentCount, CommandWordCount, EnvironmentWordCount);
   SetStatusText(summary, 0);
   TraceMessage("Docuvane::Frame --- ", "End.");
+}
+
+wxSize VirtualScreenSize() {
+  return wxSize(GetSystemMetrics(SM_CXVIRTUALSCREEN), GetSystemMetrics(SM_CYVIRTUALSCREEN));
+}
+
+wxRect ClampFrameGeometry(const wxRect& stored, const wxSize& defaultSize, const wxSize& screen) {
+  wxRect r = stored;
+  // The lower bound is the default size, not the minimum size.
+  r.width = stored.width < defaultSize.x ? defaultSize.x : std::min(stored.width, screen.x);
+  r.height = stored.height < defaultSize.y ? defaultSize.y : std::min(stored.height, screen.y);
+  if (r.x < 0) r.x = 0;
+  else if (r.x + r.width > screen.x) r.x = screen.x - r.width;
+  if (r.y < 0) r.y = 0;
+  else if (r.y + r.height > screen.y) r.y = screen.y - r.height;
+  return r;
 }
 
 MyFrame::~MyFrame() {

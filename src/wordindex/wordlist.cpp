@@ -5,7 +5,7 @@
 #include <cstdio>
 #include <cstring>
 
-#include "platform/paths.h"
+#include "platform/winapi.h"
 #include "base/trace.h"
 #include "text/text.h"
 #include "wordindex/wordindex.h"
@@ -35,7 +35,7 @@ int CompareIndexWords(const char* a, const char* b) {
 }
 
 int Fill_WordIndex(WordListData& data) {
-  const unsigned long start = GetTickCount();
+  const DWORD start = GetTickCount();
   data.Words.clear();
   data.RecordBuffer.reset();
   if (WordIndexHandle == nullptr) return 0;

@@ -1,6 +1,7 @@
 // The file-type association of the desktop, through xdg-mime and the
 // desktop entries of the XDG data directories.
 #include "platform/findexec.h"
+#include "platform/winapi.h"
 
 #include <fcntl.h>
 #include <poll.h>
@@ -236,4 +237,16 @@ std::string FindExecutable(const std::string& path) {
   }
   if (first >= words.size()) return std::string();
   return FindOnPath(words[first]);
+}
+
+UINT_PTR FindExecutableA(const char* file, const char* /*directory*/, char* result) {
+  // Windows' result buffer holds MAX_PATH characters.
+  constexpr std::size_t kResultSize = 260;
+  if (result != nullptr) result[0] = '\0';
+  const std::string program = FindExecutable(file != nullptr ? file : "");
+  if (program.empty() || result == nullptr) return 31;  // SE_ERR_NOASSOC
+  if (program.size() >= kResultSize) return 2;            // too long: not found
+  program.copy(result, program.size());
+  result[program.size()] = '\0';
+  return 33;
 }
