@@ -2,8 +2,6 @@
 // then one entry for every label of the word index.
 #include "catalogue/documents.h"
 
-#include <unistd.h>
-
 #include <cstdint>
 #include <cstring>
 #include <memory>
@@ -13,6 +11,7 @@
 #include <vector>
 
 #include "catalogue/keywords.h"
+#include "platform/files.h"
 #include "platform/profile.h"
 #include "text/text.h"
 #include "base/settings.h"
@@ -109,38 +108,10 @@ int SearchModeOf(const char* name) {
   return mode;
 }
 
-// The label strings lie back to back (their offsets never decrease), so
-// they are read in one piece rather than with a seek and a read for each.
-// Empty when that piece cannot be read; the labels are then read one by one.
-std::string ReadLabelArea(int labels) {
-  const int64_t first = LabelOffsets[1];
-  const int64_t size = static_cast<int64_t>(LabelOffsets[labels + 1]) - first;
-  std::string area;
-  if (size <= 0 || size > WordIndexSize) return area;
-  area.resize(static_cast<std::size_t>(size));
-  if (!ReadIndexBytes(first, &area[0], area.size())) area.clear();
-  return area;
-}
-
 void AppendLabels() {
-  // LabelOffsets holds entries up to kMaxLabels + 1, whatever the header says.
-  const int labels = LabelCount < kMaxLabels ? LabelCount : kMaxLabels;
-  const std::string area = ReadLabelArea(labels);
-  char buffer[kLabelBufferSize];
-  for (int k = 1; k <= labels; ++k) {
-    const int64_t length = static_cast<int64_t>(LabelOffsets[k + 1]) - LabelOffsets[k];
-    const int64_t at = static_cast<int64_t>(LabelOffsets[k]) - LabelOffsets[1];
-    const int64_t n = length < static_cast<int64_t>(sizeof buffer) - 1
-                          ? length
-                          : static_cast<int64_t>(sizeof buffer) - 1;
-    if (at >= 0 && n >= 0 && at + n <= static_cast<int64_t>(area.size())) {
-      std::memcpy(buffer, area.data() + at, static_cast<std::size_t>(n));
-      buffer[n] = '\0';
-    } else {
-      ReadIndexLabel(k, buffer, sizeof buffer);
-    }
-    const char* label = buffer;
-    if (length >= static_cast<int64_t>(kLabelBufferSize)) {
+  for (const std::string& text : ListIndexLabels()) {
+    const char* label = text.c_str();
+    if (text.size() >= kLabelBufferSize) {
       TraceMessage("WARNING: Word index label longer than 255 bytes skipped: ", label);
       continue;
     }
@@ -191,7 +162,7 @@ void Collect_Documents() {
       continue;
     }
     const std::string path(found);  // the library's string does not last
-    if (access(path.c_str(), F_OK) != 0) {
+    if (!PathExists(path)) {
       TraceMessage("ERROR: There is not Accesible Document file: ", path.c_str());
       continue;
     }

@@ -1,10 +1,7 @@
 // INI file reading with the rules of the Windows profile API.
 #include "platform/profile.h"
 
-#include <sys/stat.h>
-#include <dirent.h>
-#include <fcntl.h>
-#include <unistd.h>
+#include "platform/files.h"
 
 #include <algorithm>
 #include <cerrno>
@@ -89,8 +86,10 @@ std::unique_ptr<Profile> Parse(const char* text, std::size_t length) {
     if (value.size() >= 2 && (value.front() == '"' || value.front() == '\'') &&
         value.back() == value.front())
       value = value.substr(1, value.size() - 2);
-    if (current->by_key.emplace(Lower(key), current->entries.size()).second)
-      current->entries.emplace_back(std::move(key), std::move(value));
+    // Every key line is listed, duplicates included, as the system's own
+    // API lists them; a value lookup takes the first.
+    current->by_key.emplace(Lower(key), current->entries.size());
+    current->entries.emplace_back(std::move(key), std::move(value));
   }
   return profile;
 }
@@ -162,9 +161,7 @@ unsigned long Answer(const Profile* profile, const char* section, const char* ke
 }
 
 struct CachedFile {
-  timespec mtime;
-  off_t size;
-  ino_t inode;
+  FileStamp stamp;
   std::shared_ptr<const Profile> profile;
 };
 
@@ -196,50 +193,27 @@ std::string ResolvePath(const char* file) {
     dir = SystemDirectory();
   }
   std::string exact = dir + "/" + path;
-  if (access(exact.c_str(), F_OK) == 0) return exact;
-  if (DIR* handle = opendir(dir.c_str())) {
+  if (PathExists(exact)) return exact;
+  std::vector<DirectoryEntry> entries;
+  if (ListDirectory(dir, entries)) {
     const std::string wanted = Lower(path);
-    while (dirent* entry = readdir(handle)) {
-      if (Lower(entry->d_name) == wanted) {
-        exact = dir + "/" + entry->d_name;
-        break;
-      }
-    }
-    closedir(handle);
+    for (const DirectoryEntry& entry : entries)
+      if (Lower(entry.name) == wanted) return dir + "/" + entry.name;
   }
   return exact;
 }
 
-bool ReadFile(const std::string& path, std::string& text) {
-  int fd = open(path.c_str(), O_RDONLY | O_CLOEXEC);
-  if (fd < 0) return false;
-  text.clear();
-  char chunk[65536];
-  while (text.size() < kMaxFileBytes) {
-    ssize_t n = read(fd, chunk, sizeof chunk);
-    if (n < 0 && errno == EINTR) continue;
-    if (n <= 0) break;
-    text.append(chunk, static_cast<std::size_t>(n));
-  }
-  close(fd);
-  if (text.size() > kMaxFileBytes) text.resize(kMaxFileBytes);
-  return true;
-}
-
 std::shared_ptr<const Profile> Load(const std::string& path) {
-  struct stat st;
-  if (stat(path.c_str(), &st) != 0 || !S_ISREG(st.st_mode)) return nullptr;
+  FileStamp stamp;
+  if (!StampOf(path, stamp) || !stamp.regular) return nullptr;
   std::lock_guard<std::mutex> lock(CacheMutex());
   auto& cache = Cache();
   auto it = cache.find(path);
-  if (it != cache.end() && it->second.mtime.tv_sec == st.st_mtim.tv_sec &&
-      it->second.mtime.tv_nsec == st.st_mtim.tv_nsec && it->second.size == st.st_size &&
-      it->second.inode == st.st_ino)
-    return it->second.profile;
+  if (it != cache.end() && it->second.stamp == stamp) return it->second.profile;
   std::string text;
-  if (!ReadFile(path, text)) return nullptr;
+  if (!ReadWholeFile(path, text, kMaxFileBytes)) return nullptr;
   std::shared_ptr<const Profile> profile = Parse(text.data(), text.size());
-  cache[path] = CachedFile{st.st_mtim, st.st_size, st.st_ino, profile};
+  cache[path] = CachedFile{stamp, profile};
   return profile;
 }
 

@@ -3,13 +3,15 @@
 
 #include <cstddef>
 
-// Copies the value of [section] key from `file` into `buffer` (at most
+#include "platform/winapi.h"
+
+// GetPrivateProfileStringA (declared in winapi.h) copies the value of [section] key from `file` into `buffer` (at most
 // size - 1 characters and a NUL) and returns the number of characters
-// copied, without the NUL.  A NULL key lists the section's key names, each
-// NUL-terminated, the list ended by an extra NUL, cut to fit.  A missing
-// file, section or key yields `def`.  A bare file name is looked up in
-// /etc/lomari/.
-#include "platform/winapi.h"  // GetPrivateProfileStringA
+// copied, without the NUL.  A NULL key lists every key line of the section
+// in file order (duplicates included), each NUL-terminated, the list ended
+// by an extra NUL, cut to fit; a value lookup takes the first of duplicate
+// keys.  A missing file, section or key yields `def`.  A bare file name is
+// looked up in /etc/lomari/.
 
 // Parsed files are cached by path and modification time; tests that rewrite
 // a file within the same second call this.

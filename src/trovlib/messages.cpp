@@ -1,12 +1,9 @@
 // TrovMessage: standard error, the TROVLIB_LOG file and the in-process sink.
-#include <fcntl.h>
-#include <unistd.h>
-
-#include <cerrno>
 #include <cstdlib>
 #include <mutex>
 #include <string>
 
+#include "platform/files.h"
 #include "trovlib/trovlib.h"
 
 namespace {
@@ -32,21 +29,6 @@ int StderrLevel() {
   return static_cast<int>(level);
 }
 
-// Writes all of `data` with as few calls as the kernel allows.  For the log
-// this is one write() on an O_APPEND descriptor, so lines of several
-// processes never interleave.
-void WriteAll(int fd, const std::string& data) {
-  std::size_t done = 0;
-  while (done < data.size()) {
-    ssize_t n = write(fd, data.data() + done, data.size() - done);
-    if (n < 0) {
-      if (errno == EINTR) continue;
-      return;
-    }
-    done += static_cast<std::size_t>(n);
-  }
-}
-
 // A message is one line wherever it is written: a text that carries its own
 // line breaks (a forwarded command, a file's contents) must not split it.
 std::string OneLine(const char* prefix, const char* text) {
@@ -63,15 +45,13 @@ void TrovMessage(const char* prefix, const char* text, int level) {
   if (text == nullptr) text = "";
   const std::string line = OneLine(prefix, text);
 
-  if (level >= StderrLevel()) WriteAll(STDERR_FILENO, line + "\n");
+  if (level >= StderrLevel()) WriteToStandardError(line + "\n");
 
   const char* log = std::getenv("TROVLIB_LOG");
   if (log != nullptr && *log != '\0') {
-    int fd = open(log, O_WRONLY | O_APPEND | O_CREAT | O_CLOEXEC, 0644);
-    if (fd >= 0) {
-      WriteAll(fd, std::to_string(level) + "\t" + line + "\n");
-      close(fd);
-    }
+    // One write on an appending file, so that lines of several processes
+    // never interleave.
+    AppendToFile(log, std::to_string(level) + "\t" + line + "\n");
   }
 
   TrovMessageSink sink;

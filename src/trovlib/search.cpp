@@ -1,10 +1,7 @@
 // TrovSearch: categories, path patterns and the file-name index of each
 // recursively searched tree.
-#include <dirent.h>
-#include <sys/stat.h>
-#include <unistd.h>
-
 #include <algorithm>
+#include <cstdint>
 #include <cstdlib>
 #include <cstring>
 #include <deque>
@@ -15,6 +12,7 @@
 #include <utility>
 #include <vector>
 
+#include "platform/files.h"
 #include "trovlib/trovlib.h"
 #include "trovlib/trovlib_internal.h"
 
@@ -56,40 +54,26 @@ std::string TrimDirectory(const std::string& text) {
 
 std::unique_ptr<TreeIndex> BuildIndex(const std::string& root) {
   auto index = std::make_unique<TreeIndex>();
-  std::set<std::pair<dev_t, ino_t>> visited;  // symbolic links may form loops
+  std::set<std::pair<std::uint64_t, std::uint64_t>> visited;  // symbolic links may form loops
   std::deque<std::pair<std::string, int>> pending;
   pending.emplace_back(root, 0);
 
+  std::vector<DirectoryEntry> entries;
   while (!pending.empty()) {
     auto [dir, depth] = pending.front();
     pending.pop_front();
-    struct stat dir_stat;
-    if (stat(dir.c_str(), &dir_stat) != 0 || !S_ISDIR(dir_stat.st_mode)) continue;
-    if (!visited.insert({dir_stat.st_dev, dir_stat.st_ino}).second) continue;
+    FileStamp stamp;
+    if (!StampOf(dir, stamp) || !stamp.directory) continue;
+    if (!visited.insert({stamp.device, stamp.inode}).second) continue;
+    if (!ListDirectory(dir, entries)) continue;
+    std::sort(entries.begin(), entries.end(),
+              [](const DirectoryEntry& a, const DirectoryEntry& b) { return a.name < b.name; });
 
-    DIR* handle = opendir(dir.c_str());
-    if (handle == nullptr) continue;
-    std::vector<std::pair<std::string, unsigned char>> entries;
-    while (dirent* entry = readdir(handle)) {
-      if (std::strcmp(entry->d_name, ".") == 0 || std::strcmp(entry->d_name, "..") == 0) continue;
-      entries.emplace_back(entry->d_name, entry->d_type);
-    }
-    closedir(handle);
-    std::sort(entries.begin(), entries.end());
-
-    for (const auto& [name, type] : entries) {
-      std::string path = JoinPath(dir, name);
-      bool is_dir = type == DT_DIR;
-      bool is_file = type == DT_REG;
-      if (type == DT_LNK || type == DT_UNKNOWN) {
-        struct stat st;
-        if (stat(path.c_str(), &st) != 0) continue;
-        is_dir = S_ISDIR(st.st_mode);
-        is_file = S_ISREG(st.st_mode);
-      }
-      if (is_file) {
-        index->by_name[name].push_back(std::move(path));
-      } else if (is_dir && depth < kMaxTreeDepth) {
+    for (const DirectoryEntry& entry : entries) {
+      std::string path = JoinPath(dir, entry.name);
+      if (entry.regular) {
+        index->by_name[entry.name].push_back(std::move(path));
+      } else if (entry.directory && depth < kMaxTreeDepth) {
         pending.emplace_back(std::move(path), depth + 1);
       }
     }
@@ -102,12 +86,6 @@ const TreeIndex& IndexOf(const std::string& root) {
   auto it = indexes.find(root);
   if (it == indexes.end()) it = indexes.emplace(root, BuildIndex(root)).first;
   return *it->second;
-}
-
-bool IsRegularFile(const std::string& path, bool executable) {
-  struct stat st;
-  if (stat(path.c_str(), &st) != 0 || !S_ISREG(st.st_mode)) return false;
-  return !executable || access(path.c_str(), X_OK) == 0;
 }
 
 // The name as the index sees it: '/' separators, no empty or "." steps.

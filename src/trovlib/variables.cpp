@@ -1,11 +1,9 @@
 // Library variables, pattern expansion, TrovVar, TrovFind and TrovINIFile.
-#include <pwd.h>
-#include <unistd.h>
-
 #include <cstdlib>
 #include <string>
 #include <vector>
 
+#include "platform/files.h"
 #include "trovlib/trovlib.h"
 #include "trovlib/trovlib_internal.h"
 
@@ -19,15 +17,6 @@ constexpr std::size_t kMaxExpansions = 256;
 std::string Environment(const char* name) {
   const char* value = std::getenv(name);
   return value ? std::string(value) : std::string();
-}
-
-std::string HomeDirectory() {
-  std::string home = Environment("HOME");
-  if (!home.empty()) return home;
-  if (const passwd* pw = getpwuid(getuid())) {
-    if (pw->pw_dir && *pw->pw_dir) return pw->pw_dir;
-  }
-  return "/tmp";
 }
 
 bool IsNameChar(char c) {

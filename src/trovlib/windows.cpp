@@ -1,12 +1,10 @@
 // The per-user registry of top-level windows: one file per window name in
 // the runtime directory, holding the X11 window id in decimal.
-#include <fcntl.h>
-#include <unistd.h>
-
 #include <cerrno>
 #include <cstdlib>
 #include <string>
 
+#include "platform/files.h"
 #include "platform/paths.h"
 #include "trovlib/trovlib.h"
 
@@ -37,19 +35,8 @@ void TrovPublishWindow(const char* name, unsigned long handle) {
   }
   std::string file = RegistryFile(runtime, name);
   // Written aside and renamed, so that a reader never sees half a number.
-  std::string temp = file + ".tmp" + std::to_string(getpid());
-  int fd = open(temp.c_str(), O_WRONLY | O_CREAT | O_TRUNC | O_CLOEXEC, 0600);
-  if (fd < 0) {
-    TrovMessage("ERROR: TrovPublishWindow ", (temp + ": cannot be written").c_str(), 5);
-    return;
-  }
-  std::string text = std::to_string(handle) + "\n";
-  bool ok = write(fd, text.data(), text.size()) == static_cast<ssize_t>(text.size());
-  ok = (close(fd) == 0) && ok;
-  if (!ok || rename(temp.c_str(), file.c_str()) != 0) {
-    unlink(temp.c_str());
+  if (!ReplaceFile(file, std::to_string(handle) + "\n"))
     TrovMessage("ERROR: TrovPublishWindow ", (file + ": cannot be written").c_str(), 5);
-  }
 }
 
 unsigned long TrovLookupWindow(const char* name) {
@@ -60,13 +47,9 @@ unsigned long TrovLookupWindow(const char* name) {
     TrovMessage("ERROR: RuntimeDirectory ", error.c_str(), 5);
     return 0;
   }
-  int fd = open(RegistryFile(runtime, name).c_str(), O_RDONLY | O_CLOEXEC);
-  if (fd < 0) return 0;
-  char buffer[32];
-  ssize_t n = read(fd, buffer, sizeof buffer - 1);
-  close(fd);
-  if (n <= 0) return 0;
-  buffer[n] = '\0';
+  std::string text;
+  if (!ReadWholeFile(RegistryFile(runtime, name), text, 31) || text.empty()) return 0;
+  const char* buffer = text.c_str();
   if (buffer[0] < '0' || buffer[0] > '9') return 0;
   char* end = nullptr;
   errno = 0;

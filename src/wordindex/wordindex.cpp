@@ -6,8 +6,9 @@
 #include <vector>
 
 #include "base/trace.h"
+#include "platform/files.h"
 
-FILE* WordIndexHandle = nullptr;
+RandomAccessFile* WordIndexHandle = nullptr;
 int MinWordLength = 0;
 int MaxWordLength = 0;
 int32_t LengthOffsets[257];
@@ -17,8 +18,8 @@ int64_t WordIndexSize = 0;
 
 namespace {
 
-// Bytes behind a stream opened from memory; they must outlive the stream.
-std::vector<unsigned char> memoryImage;
+// The one open index file (or image in memory).
+RandomAccessFile g_file;
 
 // Offsets are signed 32-bit values, so no larger file can be addressed.
 constexpr int64_t kMaxIndexSize = INT32_MAX;
@@ -35,40 +36,30 @@ void Refuse(const char* why, const char* path) {
 }
 
 void Forget() {
-  if (WordIndexHandle) fclose(WordIndexHandle);
+  g_file.Close();
   WordIndexHandle = nullptr;
   MinWordLength = MaxWordLength = 0;
   LabelCount = 0;
   WordIndexSize = 0;
-  memoryImage.clear();
-  memoryImage.shrink_to_fit();
 }
 
-// Reads exactly `count` bytes at `offset` of a stream of known size.
-bool ReadAt(FILE* f, int64_t size, int64_t offset, void* buffer, std::size_t count) {
-  if (offset < 0 || offset > size || static_cast<int64_t>(count) > size - offset) return false;
-  if (fseeko(f, offset, SEEK_SET) != 0) return false;
-  return fread(buffer, 1, count, f) == count;
-}
-
-// Reads and checks the header of the stream in `f`, which is taken over:
-// it becomes WordIndexHandle on success and is closed otherwise.
-int ReadHeader(FILE* f, const char* path) {
-  int64_t size = -1;
-  if (fseeko(f, 0, SEEK_END) == 0) size = ftello(f);
+// Reads and checks the header of the file in `f`, which becomes the word
+// index on success and is closed otherwise.
+int ReadHeader(RandomAccessFile& f, const char* path) {
+  const int64_t size = f.Size();
   unsigned char head[4] = {0, 0, 0, 0};
-  if (size < 2 || !ReadAt(f, size, 0, head, 2) || head[0] != 'W' || head[1] != 'X') {
-    fclose(f);
+  if (size < 2 || !f.ReadAt(0, head, 2) || head[0] != 'W' || head[1] != 'X') {
+    f.Close();
     TraceMessage("ERROR: Invalid signature of Word Index file ", path);
     return 0;
   }
   auto fail = [&](const char* why) {
-    fclose(f);
+    f.Close();
     Refuse(why, path);
     return 0;
   };
   if (size > kMaxIndexSize) return fail("Word Index file is too large: ");
-  if (!ReadAt(f, size, 2, head + 2, 2)) return fail("Word Index file is truncated: ");
+  if (!f.ReadAt(2, head + 2, 2)) return fail("Word Index file is truncated: ");
 
   const int minLength = head[2];
   const int maxLength = head[3];
@@ -78,14 +69,14 @@ int ReadHeader(FILE* f, const char* path) {
   if (groups < 1) return fail("Invalid word lengths in Word Index file: ");
 
   std::vector<unsigned char> table(static_cast<std::size_t>(groups) * 4 + 2);
-  if (!ReadAt(f, size, 4, table.data(), table.size()))
+  if (!f.ReadAt(4, table.data(), table.size()))
     return fail("Word Index file is truncated: ");
   const int labels = static_cast<int>(BigEndian(&table[table.size() - 2], 2));
   if (labels > kMaxLabels) return fail("Too many labels in Word Index file: ");
 
   const int64_t labelTableAt = 4 + static_cast<int64_t>(table.size());
   std::vector<unsigned char> labelTable(static_cast<std::size_t>(labels + 1) * 3);
-  if (!ReadAt(f, size, labelTableAt, labelTable.data(), labelTable.size()))
+  if (!f.ReadAt(labelTableAt, labelTable.data(), labelTable.size()))
     return fail("Word Index file is truncated: ");
   const int64_t headerEnd = labelTableAt + static_cast<int64_t>(labelTable.size());
 
@@ -111,7 +102,7 @@ int ReadHeader(FILE* f, const char* path) {
     labelOffsets[k] = offset;
   }
 
-  WordIndexHandle = f;
+  WordIndexHandle = &f;
   WordIndexSize = size;
   MinWordLength = minLength;
   MaxWordLength = maxLength;
@@ -127,12 +118,11 @@ int ReadHeader(FILE* f, const char* path) {
 int OpenWordIndex(const char* path) {
   Forget();
   if (path == nullptr) path = "";
-  FILE* f = fopen(path, "rb");
-  if (f == nullptr) {
+  if (!g_file.Open(path)) {
     TraceMessage("ERROR: Can't open Word Index file: ", path);
     return 0;
   }
-  return ReadHeader(f, path);
+  return ReadHeader(g_file, path);
 }
 
 int OpenWordIndexFromMemory(const void* data, std::size_t size, const char* name) {
@@ -143,24 +133,16 @@ int OpenWordIndexFromMemory(const void* data, std::size_t size, const char* name
     TraceMessage("ERROR: Invalid signature of Word Index file ", name);
     return 0;
   }
-  memoryImage.assign(static_cast<const unsigned char*>(data),
-                     static_cast<const unsigned char*>(data) + size);
-  FILE* f = fmemopen(memoryImage.data(), memoryImage.size(), "rb");
-  if (f == nullptr) {
-    memoryImage.clear();
-    TraceMessage("ERROR: Can't open Word Index file: ", name);
-    return 0;
-  }
-  int ok = ReadHeader(f, name);
-  if (!ok) memoryImage.clear();
-  return ok;
+  g_file.OpenMemory(std::vector<unsigned char>(static_cast<const unsigned char*>(data),
+                                               static_cast<const unsigned char*>(data) + size));
+  return ReadHeader(g_file, name);
 }
 
 void CloseWordIndex() { Forget(); }
 
 bool ReadIndexBytes(int64_t offset, void* buffer, std::size_t count) {
   if (WordIndexHandle == nullptr) return false;
-  return ReadAt(WordIndexHandle, WordIndexSize, offset, buffer, count);
+  return WordIndexHandle->ReadAt(offset, buffer, count);
 }
 
 int32_t FindIndexWord(const char* word) {
@@ -204,13 +186,28 @@ int ReadIndexLabel(int index, char* buffer, std::size_t size) {
   if (WordIndexHandle == nullptr || index < 1 || index > LabelCount) return 0;
   std::size_t length = LabelOffsets[index + 1] - LabelOffsets[index];
   if (length > size - 1) length = size - 1;
-  const off_t position = ftello(WordIndexHandle);
+  // Reads name their own offset: a label read in the middle of a reference
+  // block disturbs no other reader.
   const bool ok = ReadIndexBytes(LabelOffsets[index], buffer, length);
-  if (position >= 0) fseeko(WordIndexHandle, position, SEEK_SET);
   if (!ok) {
     buffer[0] = '\0';
     return 0;
   }
   buffer[length] = '\0';
   return static_cast<int>(strlen(buffer));
+}
+
+std::vector<std::string> ListIndexLabels() {
+  std::vector<std::string> labels;
+  if (WordIndexHandle == nullptr || LabelCount < 1) return labels;
+  // The header checks keep the offsets rising inside the file, so the
+  // strings lie back to back and are read in one piece.
+  const int64_t first = LabelOffsets[1];
+  const int64_t size = static_cast<int64_t>(LabelOffsets[LabelCount + 1]) - first;
+  std::string area(static_cast<std::size_t>(size), '\0');
+  if (!ReadIndexBytes(first, &area[0], area.size())) return labels;
+  labels.reserve(static_cast<std::size_t>(LabelCount));
+  for (int k = 1; k <= LabelCount; ++k)
+    labels.push_back(area.substr(LabelOffsets[k] - first, LabelOffsets[k + 1] - LabelOffsets[k]));
+  return labels;
 }

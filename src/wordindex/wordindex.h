@@ -7,12 +7,15 @@
 #pragma once
 
 #include <cstdint>
-#include <cstdio>
+#include <string>
+#include <vector>
+
+class RandomAccessFile;
 
 constexpr int kMaxLabels = 8190;       // LabelOffsets holds entries 1..8191
 constexpr int kLabelBufferSize = 256;  // callers' label buffers
 
-extern FILE* WordIndexHandle;  // open stream, or NULL when no index is open
+extern RandomAccessFile* WordIndexHandle;  // the open file, or NULL when no index is open
 extern int MinWordLength;
 extern int MaxWordLength;
 extern int32_t LengthOffsets[257];
@@ -36,9 +39,14 @@ int32_t FindIndexWord(const char* word);
 
 // Copies label `index` into `buffer` (cut to size - 1 bytes, NUL-terminated)
 // and returns its length; 0 with an empty buffer for an index that names no
-// label.  The stream position is left where it was.
+// label.  Every read names its own offset, so a label may be read in the
+// middle of any other read.
 int ReadIndexLabel(int index, char* buffer, std::size_t size = kLabelBufferSize);
 
 // Reads `count` bytes at `offset`; false (nothing read) unless all of them
-// lie inside the file.  The stream is left after the bytes read.
+// lie inside the file.
 bool ReadIndexBytes(int64_t offset, void* buffer, std::size_t count);
+
+// Every label of the open index, whole, in index order (label k at position
+// k - 1).  Empty when no index is open or its labels cannot be read.
+std::vector<std::string> ListIndexLabels();
