@@ -44,5 +44,21 @@ int Load_Document_Index(int documentIndex, int loadKeys);
 void LoadKeywords(const char* definitionPath, int documentIndex);
 void AddKeywordTarget(const char* keyword, const char* anchor, int documentIndex);
 
-// Empties the list (tests only; the program never removes keywords).
+// Empties the list (the pool memory stays; see Clear_Tables).
 void KeywordListReset();
+
+// The first node whose keyword equals `word` ignoring case, or NULL.
+const KeywordNode* FindKeyword(const char* word);
+
+// The keyword target items of `word` ("path#anchor", newest first), and the
+// single target (path, anchor) when the word has exactly one.
+struct KeywordTargets {
+  std::vector<std::string> items;
+  bool single = false;
+  std::string singlePath;
+  std::string singleAnchor;
+};
+KeywordTargets CollectKeywordTargets(const char* word);
+
+// Keyword target texts ("path#anchor") longer than this are not listed.
+constexpr std::size_t kMaxKeywordTargetText = 127;

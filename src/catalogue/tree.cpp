@@ -90,6 +90,8 @@ Item AppendNode(DocumentTreeView& tree, Item root, Item parent, const std::strin
 
 }  // namespace
 
+Item HighlightedItem = nullptr;
+
 Item InsertPath(DocumentTreeView& tree, const char* path, Item root, Item parent,
                 int /*documentIndex*/) {
   // One level per turn rather than one call per level: a name may hold any

@@ -21,6 +21,10 @@ class DocumentTreeView {
   virtual std::string GetItemText(Item item) = 0;
 };
 
+// The tree item shown in bold as the document of the selected location;
+// NULL when none.
+extern DocumentTreeView::Item HighlightedItem;
+
 int Fill_Tree(DocumentTreeView& tree);
 DocumentTreeView::Item AddDocumentNode(DocumentTreeView& tree, const char* name, int documentIndex);
 

@@ -72,15 +72,11 @@ namespace {
 
 // The first-registered target of a dotted keyword topic, or NULL.
 const KeywordTarget* KeywordTopicTarget(const char* body) {
-  for (const KeywordNode* node = KeywordListHead.Next; node != nullptr && node != &KeywordListEnd;
-       node = node->Next) {
-    if (node->Keyword == nullptr || CompareIgnoringCase(node->Keyword, body) != 0) continue;
-    const KeywordTarget* target = node->Targets;
-    if (target == nullptr) return nullptr;
-    while (target->Next != nullptr) target = target->Next;  // newest first: the last is the oldest
-    return target;
-  }
-  return nullptr;
+  const KeywordNode* node = FindKeyword(body);
+  const KeywordTarget* target = node != nullptr ? node->Targets : nullptr;
+  if (target == nullptr) return nullptr;
+  while (target->Next != nullptr) target = target->Next;  // newest first: the last is the oldest
+  return target;
 }
 
 }  // namespace

@@ -13,14 +13,13 @@
 #include "text/wxtext_gui.h"
 #include "catalogue/documents.h"
 #include "catalogue/keywords.h"
+#include "catalogue/tree.h"
 #include "text/text.h"
 #include "trovlib/trovlib.h"
 #include "window/panel.h"
 #include "window/qlistbox.h"
 #include "wordindex/references.h"
 #include "wordindex/wordindex.h"
-
-wxTreeItemId HighlightedItem;
 
 namespace {
 
@@ -39,9 +38,9 @@ void Show_Topic(Docuvane* panel, const char* word, int openIfSingle) {
   wxListBox* locations = panel->m_targetList;
   if (locations) locations->Clear();
   if (panel->m_gotoButton) panel->m_gotoButton->Disable();
-  if (HighlightedItem.IsOk()) {
-    if (panel->m_tree) panel->m_tree->SetItemBold(HighlightedItem, false);
-    HighlightedItem.Unset();
+  if (HighlightedItem != nullptr) {
+    if (panel->m_tree) panel->m_tree->SetItemBold(wxTreeItemId(HighlightedItem), false);
+    HighlightedItem = nullptr;
   }
 
   const KeywordTargets targets = CollectKeywordTargets(word);
@@ -87,9 +86,9 @@ void HighlightDocument(Docuvane* panel, const char* text) {
 
   const wxTreeItemId item(DocumentTable[found].TreeItem);
   panel->m_tree->SelectItem(item);
-  if (HighlightedItem.IsOk()) panel->m_tree->SetItemBold(HighlightedItem, false);
+  if (HighlightedItem != nullptr) panel->m_tree->SetItemBold(wxTreeItemId(HighlightedItem), false);
   panel->m_tree->SetItemBold(item, true);
-  HighlightedItem = item;
+  HighlightedItem = item.GetID();
 }
 
 void Docuvane::OnSearch(wxCommandEvent&) {

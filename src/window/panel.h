@@ -51,9 +51,6 @@ class Docuvane : public wxSplitterWindow {
   wxDECLARE_EVENT_TABLE();
 };
 
-// The tree item shown in bold as the document of the selected location.
-extern wxTreeItemId HighlightedItem;
-
 // Fills the Locations list with the places of `word`; opens the document
 // when the word has exactly one keyword target and `openIfSingle` is set.
 void Show_Topic(Docuvane* panel, const char* word, int openIfSingle);

@@ -73,7 +73,7 @@ int ProcessCommand(Docuvane* panel, const char* command, int exact) {
 int Fill_Tree(Docuvane* panel) {
   if (!panel || !panel->m_tree) return 0;
   // Rebuilding deletes every item, the bold one too.
-  HighlightedItem.Unset();
+  HighlightedItem = nullptr;
   TreeCtrlView view(panel->m_tree);
   return Fill_Tree(view);
 }

@@ -1,12 +1,10 @@
-// Turning one word into Locations items: its keyword targets and the
-// document labels and pages of its reference block.
+// Turning one word's reference block into Locations items: document labels
+// and their pages.
 #include "wordindex/references.h"
 
 #include <cstdio>
 #include <cstring>
 
-#include "catalogue/documents.h"
-#include "catalogue/keywords.h"
 #include "text/text.h"
 #include "base/trace.h"
 #include "wordindex/wordindex.h"
@@ -59,38 +57,4 @@ int LoadWordReferences(int32_t offset, const char* word, std::vector<std::string
   }
   if (unnamed) TraceMessage("WARNING: References to no label in Word Index file for: ", word);
   return count;
-}
-
-KeywordTargets CollectKeywordTargets(const char* word) {
-  KeywordTargets result;
-  if (word == nullptr) return result;
-  const KeywordNode* match = nullptr;
-  for (const KeywordNode* node = KeywordListHead.Next; node != nullptr && node != &KeywordListEnd;
-       node = node->Next) {
-    if (node->Keyword != nullptr && CompareIgnoringCase(node->Keyword, word) == 0) {
-      match = node;
-      break;
-    }
-  }
-  if (match == nullptr) return result;
-
-  int targets = 0;
-  for (const KeywordTarget* target = match->Targets; target != nullptr; target = target->Next) {
-    ++targets;
-    if (target->DocumentIndex < 0 || target->DocumentIndex >= DocumentCount) continue;
-    const std::string& path = DocumentTable[target->DocumentIndex].Path;
-    const char* anchor = target->Anchor ? target->Anchor : "";
-    std::string text = path + "#" + anchor;
-    if (text.size() > kMaxKeywordTargetText) {
-      TraceMessage("WARNING: Keyword target too long: ", text.c_str());
-      continue;
-    }
-    if (targets == 1 && target->Next == nullptr) {
-      result.single = true;
-      result.singlePath = path;
-      result.singleAnchor = anchor;
-    }
-    result.items.push_back(std::move(text));
-  }
-  return result;
 }

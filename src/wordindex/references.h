@@ -1,4 +1,4 @@
-// Turning one word into the texts of the Locations list.
+// Turning one word's reference block into texts of the Locations list.
 #pragma once
 
 #include <cstddef>
@@ -9,16 +9,6 @@
 // Appends the index reference items of the block at `offset` to `items` and
 // returns the number of locations started; 0 on a label mismatch.
 int LoadWordReferences(int32_t offset, const char* word, std::vector<std::string>& items);
-
-// The keyword target items of `word` ("path#anchor", newest first), and the
-// single target (path, anchor) when the word has exactly one.
-struct KeywordTargets {
-  std::vector<std::string> items;
-  bool single = false;
-  std::string singlePath;
-  std::string singleAnchor;
-};
-KeywordTargets CollectKeywordTargets(const char* word);
 
 // One location of a reference block's entry list: a label index (which may
 // name no label) and its pages in file order.
@@ -36,5 +26,3 @@ std::vector<ReferenceLocation> DecodeReferenceEntries(const unsigned char* entri
 // Page numbers are appended to a location's text only while it is shorter
 // than this.
 constexpr std::size_t kPageListCut = 200;
-// Keyword target texts ("path#anchor") longer than this are not listed.
-constexpr std::size_t kMaxKeywordTargetText = 127;

@@ -38,6 +38,8 @@ int Fill_WordIndex(WordListData& data) {
   const DWORD start = GetTickCount();
   data.Words.clear();
   data.RecordBuffer.reset();
+  CommandWordCount = 0;
+  EnvironmentWordCount = 0;
   if (WordIndexHandle == nullptr) return 0;
 
   // The header checks guarantee min..max+1 offsets that rise and stay

@@ -13,7 +13,8 @@ struct WordListData {
   std::vector<const char*> Words;        // sorted, pointing into RecordBuffer
 };
 
-// Fills `data` from the open word index; 0 (list empty) when none is open.
+// Fills `data` from the open word index, counting its commands and
+// environments from zero; 0 (list empty) when none is open.
 int Fill_WordIndex(WordListData& data);
 
 // The list's order: <0, 0, >0.

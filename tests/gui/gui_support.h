@@ -15,6 +15,7 @@
 #include "catalogue/pool.h"
 #include "platform/profile.h"
 #include "base/settings.h"
+#include "catalogue/tables.h"
 #include "test_support.h"  // also filesystem, fstream, optional, string, vector
 #include "window/frame.h"
 #include "window/panel.h"
@@ -104,14 +105,8 @@ class WindowTest : public ::testing::Test {
 
   // Empties the process-wide tables an earlier frame filled.
   static void ResetProgramState() {
-    CloseWordIndex();
-    WordIndexPath.clear();
-    KeywordListReset();
-    PoolReset();
-    CommandWordCount = EnvironmentWordCount = 0;
-    HighlightedItem.Unset();
+    Clear_Tables();
     ProfileCacheClear();
-    TrovResetCaches();
   }
 
   // The next use reads the configuration file of $HOME afresh.

@@ -9,6 +9,7 @@
 #include <wx/treectrl.h>
 #include <wx/uiaction.h>
 
+#include "catalogue/tree.h"
 #include "gui_support.h"
 #include "window/about.h"
 #include "window/ids.h"
@@ -170,12 +171,12 @@ TEST_F(LookupTest, ALocationIsBoldedInTheTreeAndOpensThroughTheTemplate) {
 TEST_F(LookupTest, HighlightIgnoresCaseAndSurvivesARebuild) {
   Docuvane* p = panel();
   HighlightDocument(p, "other.pdf#page=1");
-  EXPECT_FALSE(HighlightedItem.IsOk()) << "a document the table does not know";
+  EXPECT_EQ(HighlightedItem, nullptr) << "a document the table does not know";
   HighlightDocument(p, "LATEX/Base/Sample.PDF");  // no '#': the whole text
   EXPECT_TRUE(p->m_tree->IsBold(Item("sample.pdf")));
-  ASSERT_EQ(HighlightedItem, Item("sample.pdf"));
+  ASSERT_EQ(HighlightedItem, Item("sample.pdf").GetID());
   Fill_Tree(p);  // deletes the bold item: the next lookup must not touch it
-  EXPECT_FALSE(HighlightedItem.IsOk());
+  EXPECT_EQ(HighlightedItem, nullptr);
   Show_Topic(p, "\\section", 0);
   EXPECT_EQ(p->m_targetList->GetCount(), 4u);
 }
