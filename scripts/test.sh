@@ -8,6 +8,8 @@ scripts/install-deps.sh
 scripts/build.sh --asan
 
 status=0
+echo "=== format"
+tests/check-format.sh || status=1
 echo "=== unit tests (AddressSanitizer + UBSan)"
 (cd build-asan && ASAN_OPTIONS=detect_leaks=1 UBSAN_OPTIONS=print_stacktrace=1 \
   ctest --output-on-failure -j "$(nproc)") || status=1
