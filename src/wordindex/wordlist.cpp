@@ -96,13 +96,30 @@ int FindWordInList(const std::vector<const char*>& words, const char* text, int 
   // kind of word; otherwise the kinds are looked through.
   const bool whole = (*text == '\\' || *text == '{');
   const std::size_t n = strlen(text);
+  // The list is sorted on the words without their mark, so every word whose
+  // unmarked part starts with the text's unmarked part stands in one run;
+  // the first row of that run is found by bisection.
+  const char* key = DropLead(text);
+  const std::size_t keyLength = strlen(key);
+  const auto begin = std::partition_point(words.begin(), words.end(), [&](const char* word) {
+    const unsigned char* w = reinterpret_cast<const unsigned char*>(DropLead(word));
+    const unsigned char* k = reinterpret_cast<const unsigned char*>(key);
+    for (std::size_t i = 0; i < keyLength; ++i) {
+      const unsigned char cw = FoldCase(w[i]);
+      const unsigned char ck = FoldCase(k[i]);
+      if (cw != ck) return cw < ck;  // a word that ends here is smaller too
+    }
+    return false;  // the word starts with the key: the run begins at or before it
+  });
   int first = -1;
-  for (std::size_t i = 0; i < words.size(); ++i) {
-    const char* word = whole ? words[i] : DropLead(words[i]);
+  for (auto it = begin; it != words.end(); ++it) {
+    if (!StartsWithFolded(DropLead(*it), key, keyLength)) break;  // past the run
+    const char* word = whole ? *it : DropLead(*it);
     if (!StartsWithFolded(word, text, n)) continue;
-    if (!exact) return static_cast<int>(i);
-    if (strcmp(word, text) == 0) return static_cast<int>(i);
-    if (first == -1) first = static_cast<int>(i);
+    const int row = static_cast<int>(it - words.begin());
+    if (!exact) return row;
+    if (strcmp(word, text) == 0) return row;
+    if (first == -1) first = row;
   }
   return first;
 }

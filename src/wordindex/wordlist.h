@@ -21,5 +21,7 @@ int Fill_WordIndex(WordListData& data);
 int CompareIndexWords(const char* a, const char* b);
 
 // Row of the first word that starts with `text` (see the word list rules),
-// or with `exact` the row of the word equal to it; -1 when none.
+// or with `exact` the row of the word equal to it; -1 when none.  `words`
+// must be in the list's order (CompareIndexWords), as Fill_WordIndex leaves
+// it: the search bisects.
 int FindWordInList(const std::vector<const char*>& words, const char* text, int exact);
