@@ -13,6 +13,7 @@
 #include <vector>
 
 #include "platform/files.h"
+#include "text/text.h"
 #include "trovlib/trovlib.h"
 #include "trovlib/trovlib_internal.h"
 
@@ -27,9 +28,24 @@ constexpr int kMaxTreeDepth = 64;
 // Every file below one directory, by base name.  Paths of one name keep the
 // walk's order: shallower first, then by byte order of the names, so that the
 // same tree always gives the same answer.
+// Image files are also kept under their name with the extension folded to
+// lower case: the trees this library reads were often made on file systems
+// that ignore case, so "Docuvane.BMP" must answer for "Docuvane.bmp".
 struct TreeIndex {
   std::unordered_map<std::string, std::vector<std::string>> by_name;
+  std::unordered_map<std::string, std::vector<std::string>> by_image_name;
 };
+
+// `name` with an image extension folded to lower case, or "" when its
+// extension is no image extension.
+std::string ImageName(const std::string& name) {
+  const std::size_t dot = name.rfind('.');
+  if (dot == std::string::npos || name.find('/', dot) != std::string::npos) return std::string();
+  const std::string extension = Folded(name.substr(dot));
+  for (const char* known : kImageExtensions)
+    if (extension == known) return name.substr(0, dot) + extension;
+  return std::string();
+}
 
 std::unordered_map<std::string, std::unique_ptr<TreeIndex>>& Indexes() {
   static std::unordered_map<std::string, std::unique_ptr<TreeIndex>> indexes;
@@ -72,6 +88,8 @@ std::unique_ptr<TreeIndex> BuildIndex(const std::string& root) {
     for (const DirectoryEntry& entry : entries) {
       std::string path = JoinPath(dir, entry.name);
       if (entry.regular) {
+        const std::string image = ImageName(entry.name);
+        if (!image.empty()) index->by_image_name[image].push_back(path);
         index->by_name[entry.name].push_back(std::move(path));
       } else if (entry.directory && depth < kMaxTreeDepth) {
         pending.emplace_back(std::move(path), depth + 1);
@@ -139,7 +157,7 @@ int IconSizeRank(const std::string& path, std::size_t from) {
 class Searcher {
  public:
   Searcher(const std::string& name, bool image_names, bool executable, bool rank_sizes)
-      : executable_(executable), rank_sizes_(rank_sizes) {
+      : executable_(executable), rank_sizes_(rank_sizes), image_names_(image_names) {
     std::size_t slash = name.rfind('/');
     std::string base = slash == std::string::npos ? name : name.substr(slash + 1);
     if (image_names && base.find('.') == std::string::npos) {
@@ -161,17 +179,22 @@ class Searcher {
       }
       return false;
     }
+    // Image names are looked up with their extension in any case.
+    const bool images = image_names_ && !ImageName(variants_.front()).empty();
     const TreeIndex& index = IndexOf(root.dir);
     // Best is the lowest size rank, then the earliest variant, then the
     // earliest path; without ranking the first match wins at once.
     const std::string* best = nullptr;
     int best_rank = 5;
-    for (const auto& variant : variants_) {
+    const auto& names = images ? index.by_image_name : index.by_name;
+    for (const auto& given : variants_) {
+      const std::string variant = images ? ImageName(given) : given;
       std::size_t slash = variant.rfind('/');
-      auto it = index.by_name.find(slash == std::string::npos ? variant : variant.substr(slash + 1));
-      if (it == index.by_name.end()) continue;
+      auto it = names.find(slash == std::string::npos ? variant : variant.substr(slash + 1));
+      if (it == names.end()) continue;
       for (const auto& path : it->second) {
-        if (slash != std::string::npos && !HasTail(path, variant)) continue;
+        if (slash != std::string::npos && !HasTail(images ? ImageName(path) : path, variant))
+          continue;
         if (executable_ && !IsRegularFile(path, true)) continue;
         int rank = rank_sizes_ ? IconSizeRank(path, root.dir.size()) : 0;
         if (rank < best_rank) {
@@ -198,6 +221,7 @@ class Searcher {
   std::vector<std::string> variants_;
   bool executable_;
   bool rank_sizes_;
+  bool image_names_;
 };
 
 std::vector<std::string> IconThemes() {

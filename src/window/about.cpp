@@ -33,11 +33,12 @@ AboutDlg::AboutDlg(wxWindow* parent)
   wxBoxSizer* column = new wxBoxSizer(wxVERTICAL);
 
   if (const char* found = TrovSearch("Logo", "Docuvane")) {
+    // An unreadable logo still takes its place: the spacer and an empty
+    // picture, so the dialog keeps its shape.
     const wxImage image = LoadPicture(found);
-    if (image.IsOk()) {
-      column->AddSpacer(kGap);
-      column->Add(new wxStaticBitmap(this, wxID_ANY, wxBitmap(image)), 0, wxALIGN_CENTRE_HORIZONTAL);
-    }
+    column->AddSpacer(kGap);
+    column->Add(new wxStaticBitmap(this, wxID_ANY, image.IsOk() ? wxBitmap(image) : wxBitmap()), 0,
+                wxALIGN_CENTRE_HORIZONTAL);
   }
   column->AddSpacer(kGap);
 
