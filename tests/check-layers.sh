@@ -3,7 +3,8 @@
 # src/base) uses nothing of ours; core (the other folders of src/, and
 # tools/) may use base and never the GUI toolkit; gui (src/window,
 # src/shell and every *_gui file) may use both.  Also fails when two folders
-# of src/ include each other.  Prints each offence; exits 1 on any.
+# of src/ include each other, and when a file outside src/platform includes
+# a system header of the operating system.  Prints each offence; exits 1 on any.
 set -u
 cd "$(dirname "$0")/.."
 awk '
@@ -16,6 +17,9 @@ function folder(path,  parts) { split(path, parts, "/"); return parts[1] == "src
 FNR == 1 { file = FILENAME }
 /^[ \t]*#[ \t]*include[ \t]*</ {
   if (layer(file) < 3 && $0 ~ /<wx\//) { print file ": includes the GUI toolkit: " $0; bad = 1 }
+  if (file !~ /^src\/platform\// && $0 ~ /<(unistd|fcntl|dirent|dlfcn|pwd|poll|spawn|signal|windows|shellapi)\.h>|<(sys|X11|gtk|gdk)\//) {
+    print file ": an operating-system header outside src/platform: " $0; bad = 1
+  }
 }
 /^[ \t]*#[ \t]*include[ \t]*"/ {
   header = $0; sub(/^[^"]*"/, "", header); sub(/".*$/, "", header)
