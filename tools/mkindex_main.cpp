@@ -110,8 +110,11 @@ int Scan(std::vector<std::string> args) {
   const char* texmf = getenv("TEXMF");
   if (trees.empty()) {
     if ((texmf == nullptr || *texmf == '\0') && InstalledTexTrees().empty()) {
-      std::cerr << "docuvane-mkindex: no TeX installation found (no kpsewhich and no TeX tree in "
-                   "the usual places); set TEXMF or name the trees to scan\n";
+      const char* text =
+          "no TeX installation found (no kpsewhich and no TeX tree in the usual places); set "
+          "TEXMF or name the trees to scan";
+      if (lines) std::cout << "error " << text << std::endl;
+      std::cerr << "docuvane-mkindex: " << text << "\n";
       return 1;
     }
     const char* value = TrovVar("TEXMF");
@@ -145,6 +148,7 @@ int Scan(std::vector<std::string> args) {
   const ScanResult result = Scan_Documentation(options);
   if (drawn) std::cerr << "\r\033[K";
   if (!result.ok) {
+    if (lines) std::cout << "error " << result.error << std::endl;
     std::cerr << "docuvane-mkindex: " << result.error << "\n";
     return 1;
   }
