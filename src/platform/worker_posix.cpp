@@ -67,8 +67,14 @@ bool Launch(std::size_t job, const IsolationLimits& limits,
   if (pid == 0) {
     close(fds[0]);
     LimitChild(limits);
-    const std::string result = work(job);
-    _exit(WriteAll(fds[1], result) ? 0 : 3);
+    // Nothing may leave the child but its result: an exception unwinding
+    // into the caller's code would go on running the caller in two copies.
+    try {
+      const std::string result = work(job);
+      _exit(WriteAll(fds[1], result) ? 0 : 3);
+    } catch (...) {
+      _exit(4);
+    }
   }
   close(fds[1]);
   fcntl(fds[0], F_SETFL, fcntl(fds[0], F_GETFL) | O_NONBLOCK);
