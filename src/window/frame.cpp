@@ -5,20 +5,27 @@
 #include <wx/config.h>
 #include <wx/iconbndl.h>
 #include <wx/image.h>
+#include <wx/listbox.h>
 #include <wx/mstream.h>
+#include <wx/treectrl.h>
 
 #include <cstdio>
 
-#include "access/start_page.h"
-#include "platform/winapi.h"
 #include "access/desktop_services_gui.h"
-#include "catalogue/documents.h"
-#include "docuvane_icons.h"
+#include "access/start_page.h"
+#include "base/settings.h"
 #include "base/trace.h"
+#include "catalogue/documents.h"
+#include "catalogue/tables.h"
+#include "docuvane_icons.h"
+#include "platform/winapi.h"
 #include "trovlib/trovlib.h"
 #include "window/about.h"
 #include "window/ids.h"
 #include "window/panel.h"
+#include "window/qlistbox.h"
+#include "window/scan_dialog.h"
+#include "wordindex/locate.h"
 #include "wordindex/wordlist.h"
 
 const char* AppTitle = "Lomari Docuvane";
@@ -56,9 +63,9 @@ wxBEGIN_EVENT_TABLE(MyFrame, wxFrame)
   EVT_BUTTON(ID_INTERNET, MyFrame::OnInternet)
   EVT_BUTTON(wxID_HELP, MyFrame::OnHelp)
 wxEND_EVENT_TABLE()
-// clang-format on
+    // clang-format on
 
-MyFrame::MyFrame(const wxString& title)
+    MyFrame::MyFrame(const wxString& title)
     : wxFrame(nullptr, wxID_ANY, title, wxDefaultPosition, wxDefaultSize, wxDEFAULT_FRAME_STYLE,
               wxFrameNameStr) {
   long x = kDefaultX, y = kDefaultY, w = kDefaultW, h = kDefaultH;
@@ -80,8 +87,8 @@ MyFrame::MyFrame(const wxString& title)
 
   const wxIconBundle icons = ApplicationIcons();
   if (icons.GetIconCount() > 0) SetIcons(icons);
-  SetFont(wxFont(10, wxFONTFAMILY_DEFAULT, wxFONTSTYLE_NORMAL, wxFONTWEIGHT_NORMAL, false, wxEmptyString,
-                 wxFONTENCODING_DEFAULT));
+  SetFont(wxFont(10, wxFONTFAMILY_DEFAULT, wxFONTSTYLE_NORMAL, wxFONTWEIGHT_NORMAL, false,
+                 wxEmptyString, wxFONTENCODING_DEFAULT));
 
   CreateStatusBar(1);
   SetStatusText("There are # documents including # TeX commands and # LaTeX environments.", 0);
@@ -97,13 +104,35 @@ MyFrame::MyFrame(const wxString& title)
   Fill_Tree(m_helpPanel);
   TraceMessage("Docuvane::Frame --- ", "Fill_WordIndex ...");
   TraceMessage("Docuvane::Frame --- ", "Post.");
+  ShowCounts();
+  TraceMessage("Docuvane::Frame --- ", "End.");
+  // Once the window is up: a TeX installation without the user's index
+  // yet gets the offer to build it.
+  CallAfter([this] {
+    if (ShouldOfferDocumentationScan()) OfferDocumentationScan(this);
+  });
+}
 
+void MyFrame::ShowCounts() {
   char summary[160];
   std::snprintf(summary, sizeof summary,
                 "There are %d documents including %d TeX commands and %d LaTeX environments.",
                 DocumentCount, CommandWordCount, EnvironmentWordCount);
   SetStatusText(summary, 0);
-  TraceMessage("Docuvane::Frame --- ", "End.");
+}
+
+void MyFrame::Reload_Catalogue() {
+  // The windows point into the tables: empty them first.
+  Docuvane* panel = m_helpPanel;
+  if (panel->m_targetList) panel->m_targetList->Clear();
+  if (panel->m_tree) panel->m_tree->DeleteAllItems();
+  if (panel->m_wordList) panel->m_wordList->SetItemCount(0);
+  Clear_Tables();
+  Docuvane_Init(OpenInstalledWordIndex);
+  if (panel->m_wordList) panel->m_wordList->Refill();
+  Collect_Documents();
+  Fill_Tree(panel);
+  ShowCounts();
 }
 
 wxSize VirtualScreenSize() {
@@ -115,10 +144,14 @@ wxRect ClampFrameGeometry(const wxRect& stored, const wxSize& defaultSize, const
   // The lower bound is the default size, not the minimum size.
   r.width = stored.width < defaultSize.x ? defaultSize.x : std::min(stored.width, screen.x);
   r.height = stored.height < defaultSize.y ? defaultSize.y : std::min(stored.height, screen.y);
-  if (r.x < 0) r.x = 0;
-  else if (r.x + r.width > screen.x) r.x = screen.x - r.width;
-  if (r.y < 0) r.y = 0;
-  else if (r.y + r.height > screen.y) r.y = screen.y - r.height;
+  if (r.x < 0)
+    r.x = 0;
+  else if (r.x + r.width > screen.x)
+    r.x = screen.x - r.width;
+  if (r.y < 0)
+    r.y = 0;
+  else if (r.y + r.height > screen.y)
+    r.y = screen.y - r.height;
   return r;
 }
 
@@ -127,8 +160,8 @@ MyFrame::~MyFrame() {
                      ToDIP(GetSize()));
 }
 
-void WriteFrameGeometry(wxConfigBase* config, bool iconized, bool maximized, const wxPoint& position,
-                        const wxSize& size) {
+void WriteFrameGeometry(wxConfigBase* config, bool iconized, bool maximized,
+                        const wxPoint& position, const wxSize& size) {
   // A minimized frame has no geometry worth keeping; a maximized one keeps
   // the last normal geometry for the next start.
   if (!config || iconized) return;

@@ -23,7 +23,14 @@ class MyFrame : public wxFrame {
   void OnHelp(wxCommandEvent& event);
   void OnInternet(wxCommandEvent& event);
 
+  // Loads the settings, the word index and the catalogue again and shows
+  // them, as after a start (a scan has just replaced them).
+  void Reload_Catalogue();
+
  private:
+  // "There are ... documents ..." in the status bar.
+  void ShowCounts();
+
   wxDECLARE_EVENT_TABLE();
 };
 
@@ -37,5 +44,5 @@ wxRect ClampFrameGeometry(const wxRect& stored, const wxSize& defaultSize, const
 // What closing stores under "/MainWindow" (position and size in DIPs):
 // nothing when minimized, only Max = 1 when maximized, else x, y, w, h and
 // Max = 0.
-void WriteFrameGeometry(wxConfigBase* config, bool iconized, bool maximized, const wxPoint& position,
-                        const wxSize& size);
+void WriteFrameGeometry(wxConfigBase* config, bool iconized, bool maximized,
+                        const wxPoint& position, const wxSize& size);

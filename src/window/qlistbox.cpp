@@ -17,10 +17,9 @@ constexpr int kFallbackRowHeight = 32;
 
 wxIMPLEMENT_DYNAMIC_CLASS(QListBox, wxVListBox);
 
-wxBEGIN_EVENT_TABLE(QListBox, wxVListBox)
-wxEND_EVENT_TABLE()
+wxBEGIN_EVENT_TABLE(QListBox, wxVListBox) wxEND_EVENT_TABLE()
 
-QListBox::QListBox() {
+    QListBox::QListBox() {
   MeasureRowHeight();
   SetMargins(8, 0);
 }
@@ -38,6 +37,15 @@ bool QListBox::Create(wxWindow* parent, wxWindowID id, const wxPoint& pos, const
   SetItemCount(static_cast<size_t>(WordCount));
   MeasureRowHeight();
   return created;
+}
+
+void QListBox::Refill() {
+  // The rows point into Data: the control forgets them before they go.
+  SetItemCount(0);
+  Fill_WordIndex(Data);
+  WordCount = static_cast<int>(Data.Words.size());
+  SetItemCount(static_cast<size_t>(WordCount));
+  Refresh();
 }
 
 void QListBox::MeasureRowHeight() {

@@ -16,6 +16,10 @@ class QListBox : public wxVListBox {
   bool Create(wxWindow* parent, wxWindowID id, const wxPoint& pos = wxDefaultPosition,
               const wxSize& size = wxDefaultSize);
 
+  // Empties the list, then fills it again from the word index now open
+  // (after a new index was built).
+  void Refill();
+
   // The word of row n, or an empty string outside the list.
   wxString GetString(int n) const;
   // The same word as the index holds it (8-bit), or "".
