@@ -1,9 +1,5 @@
 // The file-type association of the desktop, through xdg-mime and the
 // desktop entries of the XDG data directories (platform/desktop_entry.h).
-#include "platform/findexec.h"
-#include "platform/desktop_entry.h"
-#include "platform/winapi.h"
-
 #include <fcntl.h>
 #include <poll.h>
 #include <signal.h>
@@ -17,6 +13,10 @@
 #include <cstdlib>
 #include <string>
 #include <vector>
+
+#include "platform/desktop_entry.h"
+#include "platform/findexec.h"
+#include "platform/winapi.h"
 
 extern char** environ;
 
@@ -82,7 +82,9 @@ bool RunAndCapture(const char* const* argv, std::string& output, int timeoutMs) 
   bool timedOut = false;
   char buffer[4096];
   for (;;) {
-    auto left = std::chrono::duration_cast<std::chrono::milliseconds>(deadline - std::chrono::steady_clock::now()).count();
+    auto left = std::chrono::duration_cast<std::chrono::milliseconds>(
+                    deadline - std::chrono::steady_clock::now())
+                    .count();
     if (left <= 0) {
       timedOut = true;
       break;
@@ -147,7 +149,7 @@ UINT_PTR FindExecutableA(const char* file, const char* /*directory*/, char* resu
   if (result != nullptr) result[0] = '\0';
   const std::string program = FindExecutable(file != nullptr ? file : "");
   if (program.empty() || result == nullptr) return 31;  // SE_ERR_NOASSOC
-  if (program.size() >= kResultSize) return 2;            // too long: not found
+  if (program.size() >= kResultSize) return 2;          // too long: not found
   program.copy(result, program.size());
   result[program.size()] = '\0';
   return 33;
