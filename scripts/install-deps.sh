@@ -7,7 +7,8 @@ packages="build-essential cmake ninja-build pkg-config
 libwxgtk3.2-dev libcurl4-openssl-dev
 libgtest-dev libgmock-dev libbenchmark-dev
 xvfb xauth xdg-utils curl fonts-dejavu-core clang-format
-hicolor-icon-theme adwaita-icon-theme"
+hicolor-icon-theme adwaita-icon-theme
+desktop-file-utils appstream dpkg-dev"
 
 missing=""
 for p in $packages; do

@@ -1,8 +1,5 @@
 // The file-type association of the desktop, through xdg-mime and the
-// desktop entries of the XDG data directories.
-#include "platform/findexec.h"
-#include "platform/winapi.h"
-
+// desktop entries of the XDG data directories (platform/desktop_entry.h).
 #include <fcntl.h>
 #include <poll.h>
 #include <signal.h>
@@ -14,8 +11,12 @@
 #include <cerrno>
 #include <chrono>
 #include <cstdlib>
-#include <fstream>
+#include <string>
 #include <vector>
+
+#include "platform/desktop_entry.h"
+#include "platform/findexec.h"
+#include "platform/winapi.h"
 
 extern char** environ;
 
@@ -35,99 +36,6 @@ std::string Trim(const std::string& text) {
 bool IsExecutableFile(const std::string& path) {
   struct stat st;
   return stat(path.c_str(), &st) == 0 && S_ISREG(st.st_mode) && access(path.c_str(), X_OK) == 0;
-}
-
-
-// Splits an Exec value into its words: blanks separate, double quotes group,
-// and inside quotes a backslash escapes the next character.
-std::vector<std::string> SplitExec(const std::string& value) {
-  std::vector<std::string> words;
-  std::string word;
-  bool started = false;
-  bool quoted = false;
-  for (std::size_t i = 0; i < value.size(); ++i) {
-    char c = value[i];
-    if (quoted) {
-      if (c == '\\' && i + 1 < value.size()) {
-        word += value[++i];
-      } else if (c == '"') {
-        quoted = false;
-      } else {
-        word += c;
-      }
-    } else if (c == ' ' || c == '\t') {
-      if (started) words.push_back(word);
-      word.clear();
-      started = false;
-    } else if (c == '"') {
-      quoted = true;
-      started = true;
-    } else {
-      word += c;
-      started = true;
-    }
-  }
-  if (started) words.push_back(word);
-  return words;
-}
-
-// The Exec value of the [Desktop Entry] group of a desktop file, or "".
-std::string ReadExecLine(const std::string& file) {
-  std::ifstream in(file);
-  if (!in) return std::string();
-  std::string line;
-  bool inEntry = false;
-  while (std::getline(in, line)) {
-    line = Trim(line);
-    if (!line.empty() && line[0] == '[') {
-      inEntry = line == "[Desktop Entry]";
-      continue;
-    }
-    if (!inEntry || line.compare(0, 4, "Exec") != 0) continue;
-    std::string rest = Trim(line.substr(4));
-    if (!rest.empty() && rest[0] == '=') return Trim(rest.substr(1));
-  }
-  return std::string();
-}
-
-std::vector<std::string> DataDirectories() {
-  std::vector<std::string> dirs;
-  const char* home = std::getenv("XDG_DATA_HOME");
-  if (home && *home) {
-    dirs.push_back(home);
-  } else if (const char* h = std::getenv("HOME")) {
-    dirs.push_back(std::string(h) + "/.local/share");
-  }
-  const char* system = std::getenv("XDG_DATA_DIRS");
-  std::string list = system && *system ? system : "/usr/local/share:/usr/share";
-  std::size_t start = 0;
-  while (start < list.size()) {
-    std::size_t end = list.find(':', start);
-    if (end == std::string::npos) end = list.size();
-    if (end > start) dirs.push_back(list.substr(start, end - start));
-    start = end + 1;
-  }
-  return dirs;
-}
-
-// A desktop file id may stand for a file in a subdirectory: "a-b.desktop"
-// is also looked for as "a/b.desktop".
-std::string FindDesktopFile(const std::string& id) {
-  if (id.empty() || id.find('/') != std::string::npos) return std::string();
-  std::vector<std::string> names{id};
-  std::string variant = id;
-  for (std::size_t pos = variant.find('-'); pos != std::string::npos; pos = variant.find('-', pos + 1)) {
-    variant[pos] = '/';
-    names.push_back(variant);
-  }
-  for (const std::string& dir : DataDirectories()) {
-    for (const std::string& name : names) {
-      std::string path = dir + "/applications/" + name;
-      struct stat st;
-      if (stat(path.c_str(), &st) == 0 && S_ISREG(st.st_mode)) return path;
-    }
-  }
-  return std::string();
 }
 
 }  // namespace
@@ -174,7 +82,9 @@ bool RunAndCapture(const char* const* argv, std::string& output, int timeoutMs) 
   bool timedOut = false;
   char buffer[4096];
   for (;;) {
-    auto left = std::chrono::duration_cast<std::chrono::milliseconds>(deadline - std::chrono::steady_clock::now()).count();
+    auto left = std::chrono::duration_cast<std::chrono::milliseconds>(
+                    deadline - std::chrono::steady_clock::now())
+                    .count();
     if (left <= 0) {
       timedOut = true;
       break;
@@ -221,15 +131,9 @@ std::string FindExecutable(const std::string& path) {
   std::string mime = Trim(output);
   if (mime.empty() || mime.find('\n') != std::string::npos) return std::string();
 
-  const char* query[] = {"xdg-mime", "query", "default", mime.c_str(), nullptr};
-  if (!RunAndCapture(query, output, kHelperTimeoutMs)) return std::string();
-  std::string id = Trim(output);
-  std::size_t newline = id.find('\n');
-  if (newline != std::string::npos) id = Trim(id.substr(0, newline));
-
-  std::string desktopFile = FindDesktopFile(id);
-  if (desktopFile.empty()) return std::string();
-  std::vector<std::string> words = SplitExec(ReadExecLine(desktopFile));
+  DesktopEntry entry;
+  if (!ReadDesktopEntry(DefaultApplicationId(mime), entry)) return std::string();
+  std::vector<std::string> words = SplitDesktopExec(entry.exec);
   std::size_t first = 0;
   if (first < words.size() && words[first] == "env") {
     ++first;
@@ -245,7 +149,7 @@ UINT_PTR FindExecutableA(const char* file, const char* /*directory*/, char* resu
   if (result != nullptr) result[0] = '\0';
   const std::string program = FindExecutable(file != nullptr ? file : "");
   if (program.empty() || result == nullptr) return 31;  // SE_ERR_NOASSOC
-  if (program.size() >= kResultSize) return 2;            // too long: not found
+  if (program.size() >= kResultSize) return 2;          // too long: not found
   program.copy(result, program.size());
   result[program.size()] = '\0';
   return 33;

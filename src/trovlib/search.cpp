@@ -13,6 +13,7 @@
 #include <vector>
 
 #include "platform/files.h"
+#include "platform/program_dir.h"
 #include "text/text.h"
 #include "trovlib/trovlib.h"
 #include "trovlib/trovlib_internal.h"
@@ -266,7 +267,12 @@ const char* TrovSearch(const char* spec, const char* name) {
   } else if (program) {
     groups.push_back({{}, false, false});
     const char* path = std::getenv("PATH");
-    for (const auto& dir : SplitList(path ? path : "")) groups.back().roots.push_back({TrimDirectory(dir), false});
+    for (const auto& dir : SplitList(path ? path : ""))
+      groups.back().roots.push_back({TrimDirectory(dir), false});
+    // Then the program's own directory, so that the tools installed or
+    // built beside it (the PDF launcher) are found without PATH.
+    const std::string own = ProgramDirectory();
+    if (!own.empty()) groups.back().roots.push_back({TrimDirectory(own), false});
   } else if (category == "Icon") {
     groups.push_back({{}, true, true});
     AddPatternRoots("$TEXMF/Docuvane/icons//", groups.back().roots);

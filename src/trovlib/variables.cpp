@@ -7,6 +7,7 @@
 #include "platform/files.h"
 #include "platform/findexec.h"
 #include "trovlib/trees.h"
+#include "trovlib/sample_tree.h"
 #include "trovlib/trovlib.h"
 #include "trovlib/trovlib_internal.h"
 
@@ -128,7 +129,7 @@ std::string DefaultTexmf() {
   const std::string user = UserTexTree();
   std::string joined;
   for (const std::string& tree :
-       ChooseDefaultTrees(user, IsDirectory(user), InstalledTexTrees(), DOCUVANE_SAMPLE_TEXMF))
+       ChooseDefaultTrees(user, IsDirectory(user), InstalledTexTrees(), SampleTreeDirectory()))
     joined += (joined.empty() ? "" : ":") + tree;
   key = now;
   value = joined;
@@ -168,7 +169,7 @@ bool LookupVariable(const std::string& name, std::string& value) {
     // otherwise they are the scanner's, in the user's tree (or the sample's).
     if (!Environment("TEXMF").empty()) return LookupVariable("TEXMF", value);
     const std::string texmf = DefaultTexmf();
-    value = texmf == DOCUVANE_SAMPLE_TEXMF ? texmf : UserTexTree();
+    value = texmf == SampleTreeDirectory() ? texmf : UserTexTree();
     return true;
   }
   if (name == "VARTEX") {
