@@ -12,47 +12,33 @@
 namespace testing_support {
 
 struct FakeAccessServices : AccessServices {
+  using Args = std::vector<std::string>;
   struct DownloadCall {
     std::string message, url, path;
   };
-  long Execute(const std::vector<std::string>& argv) override {
-    executed.push_back(argv);
-    return onExecute ? onExecute(argv) : executeResult;
-  }
+  // clang-format off
+  long Execute(const Args& argv) override { return executed.push_back(argv), executeResult; }
   bool LaunchDefaultApplication(const std::string& path) override {
-    defaultApplication.push_back(path);
-    return defaultApplicationResult;
+    return defaultApplication.push_back(path), defaultApplicationResult;
   }
-  bool LaunchDefaultBrowser(const std::string& url) override {
-    browser.push_back(url);
-    return browserResult;
-  }
-  std::string FindExecutable(const std::string& path) override {
-    findExecutable.push_back(path);
-    return reader;
-  }
-  int Download(const std::string& message, const std::string& url,
-               const std::string& path) override {
+  bool LaunchDefaultBrowser(const std::string& url) override { return browser.push_back(url), browserResult; }
+  std::string FindExecutable(const std::string&) override { return reader; }
+  int Download(const std::string& message, const std::string& url, const std::string& path) override {
     downloads.push_back({message, url, path});
     return onDownload ? onDownload(downloads.back()) : 0;
   }
-  void ShowError(const std::string& message, const std::string& caption) override {
-    errors.emplace_back(message, caption);
-  }
+  void ShowError(const std::string& m, const std::string& c) override { errors.emplace_back(m, c); }
+  // clang-format on
   bool Untouched() const {  // nothing at all reached the desktop
-    return executed.empty() && defaultApplication.empty() && browser.empty() && downloads.empty() &&
-           errors.empty();
+    return executed.empty() && defaultApplication.empty() && downloads.empty() && errors.empty();
   }
 
-  // Answers.
-  long executeResult = 4242;
-  std::function<long(const std::vector<std::string>&)> onExecute;
+  long executeResult = 4242;  // answers
   bool defaultApplicationResult = true, browserResult = true;
   std::string reader;  // what FindExecutable gives
   std::function<int(const DownloadCall&)> onDownload;
-  // Records.
-  std::vector<std::vector<std::string>> executed;
-  std::vector<std::string> defaultApplication, browser, findExecutable;
+  std::vector<Args> executed;  // records
+  Args defaultApplication, browser;
   std::vector<DownloadCall> downloads;
   std::vector<std::pair<std::string, std::string>> errors;
 };

@@ -2,9 +2,6 @@
 #include "access/download.h"
 
 #include <curl/curl.h>
-#include <fcntl.h>
-#include <sys/stat.h>
-#include <unistd.h>
 
 #include <algorithm>
 #include <cctype>
@@ -15,14 +12,16 @@
 #include <cstring>
 #include <mutex>
 
-#include "trovlib/trovlib.h"
+#include "pdf/pdf_check.h"
+#include "platform/partfile.h"
 #include "text/text.h"
+#include "trovlib/trovlib.h"
 
 namespace {
 
 constexpr int kMaxRedirections = 10;
-constexpr std::size_t kReadChunk = 4096;         // one progress step per piece of this size
-constexpr std::size_t kMessageLimit = 255;       // progress messages
+constexpr std::size_t kReadChunk = 4096;    // one progress step per piece of this size
+constexpr std::size_t kMessageLimit = 255;  // progress messages
 constexpr int kKeepAliveMs = 100;
 constexpr long kCurlBufferSize = 128 * 1024;
 
@@ -42,6 +41,12 @@ bool IsRedirection(long code) {
 
 bool IsHex(char c) { return std::isxdigit(static_cast<unsigned char>(c)) != 0; }
 
+void AppendEscaped(std::string& out, unsigned char c) {
+  char hex[4];
+  std::snprintf(hex, sizeof hex, "%%%02X", c);
+  out += hex;
+}
+
 // Percent-encodes what may not stand in a URL as it is (blanks, controls,
 // quotes, 8-bit bytes), so that names of any kind reach the server as one
 // path and never split a request line.
@@ -53,9 +58,7 @@ std::string EscapeUrl(const std::string& url) {
     bool escape = c <= 0x20 || c >= 0x7f || std::strchr(kUnsafe, c) != nullptr;
     if (c == '%' && !(i + 2 < url.size() && IsHex(url[i + 1]) && IsHex(url[i + 2]))) escape = true;
     if (escape) {
-      char hex[4];
-      std::snprintf(hex, sizeof hex, "%%%02X", c);
-      out += hex;
+      AppendEscaped(out, c);
     } else {
       out += static_cast<char>(c);
     }
@@ -91,12 +94,11 @@ struct Transfer {
   int expected = 0;
   CURL* easy = nullptr;
   std::string targetPath;
-  std::string tempPath;
-  FILE* file = nullptr;
+  PartFile file;
   std::int64_t count = 0;
   bool http = false;
-  bool bodySeen = false;      // the response's body started (headers complete)
-  bool redirected = false;    // a redirection: its body is not wanted
+  bool bodySeen = false;    // the response's body started (headers complete)
+  bool redirected = false;  // a redirection: its body is not wanted
   bool createFailed = false;
   bool writeFailed = false;
   bool aborted = false;
@@ -131,27 +133,7 @@ struct Transfer {
     Answer(dialog->KeepAlive(Value()));
   }
 
-  bool OpenTemp() {
-    std::string name = targetPath + ".part-XXXXXX";
-    int fd = mkstemp(name.data());
-    if (fd < 0) return false;
-    fchmod(fd, 0644);
-    file = fdopen(fd, "wb");
-    if (file == nullptr) {
-      close(fd);
-      unlink(name.c_str());
-      return false;
-    }
-    tempPath = name;
-    return true;
-  }
-
-  void DropTemp() {
-    if (file) std::fclose(file);
-    file = nullptr;
-    if (!tempPath.empty()) unlink(tempPath.c_str());
-    tempPath.clear();
-  }
+  bool OpenTemp() { return file.Create(targetPath); }
 };
 
 size_t OnHeader(char* data, size_t size, size_t count, void* user) {
@@ -181,14 +163,14 @@ size_t OnData(char* data, size_t size, size_t count, void* user) {
     if (t.http && IsRedirection(code)) t.redirected = true;
   }
   if (t.redirected) return 0;  // stop: the body of a redirection is not the document
-  if (t.file == nullptr && !t.OpenTemp()) {
+  if (!t.file.IsOpen() && !t.OpenTemp()) {
     t.createFailed = true;
     return 0;
   }
   std::size_t done = 0;
   while (done < total) {
     std::size_t n = std::min(kReadChunk, total - done);
-    if (std::fwrite(data + done, 1, n, t.file) != n) {
+    if (!t.file.Write(data + done, n)) {
       t.writeFailed = true;
       return 0;
     }
@@ -236,7 +218,43 @@ struct CurlHandles {
   }
 };
 
+// Whether what arrived is the whole document, judged before it takes the
+// document's place.  Without a Content-Length only a clean end of the
+// connection says the body is over; a document named *.pdf must also be a
+// whole PDF file, which a body cut at a revision's end or one short is not.
+bool IsComplete(Transfer& t, CURLcode result, long code, const std::string& source) {
+  curl_off_t announced = -1;
+  curl_easy_getinfo(t.easy, CURLINFO_CONTENT_LENGTH_DOWNLOAD_T, &announced);
+  std::string problem;
+  if (t.writeFailed) {
+    Error("ERROR: wxGet can't write file: ", t.targetPath);
+  } else if (result != CURLE_OK) {
+    Error("ERROR: wxGet transfer failed for ", source + " (" + curl_easy_strerror(result) + ")");
+  } else if (t.http && code != 200) {
+    Error("ERROR: wxGet no document at ", source + " (HTTP " + std::to_string(code) + ")");
+  } else if (announced >= 0 && announced != t.count) {
+    Error("ERROR: wxGet incomplete transfer of ", source);
+  } else if (EndsWithIgnoringCase(t.targetPath, ".pdf") && !IsCompletePdf(t.file.path(), problem)) {
+    Error("ERROR: wxGet no complete PDF document from ", source + " (" + problem + ")");
+  } else {
+    return true;
+  }
+  return false;
+}
+
 }  // namespace
+
+std::string EscapeUrlPath(const std::string& name) {
+  std::string out;
+  for (char c : name) {
+    if (c == '#' || c == '?' || c == '%') {
+      AppendEscaped(out, static_cast<unsigned char>(c));
+    } else {
+      out += c;
+    }
+  }
+  return out;
+}
 
 void SetDownloadLimits(const DownloadLimits& limits) {
   std::lock_guard<std::mutex> lock(g_limitsMutex);
@@ -262,8 +280,9 @@ int wxGet(DownloadProgress& dialog, int first, int last, const char* url, const 
   }
 
   std::size_t slash = source.rfind('/');
-  const std::string progressMessage =
-      CutUtf8("Downloading " + (slash == std::string::npos ? source : source.substr(slash + 1)) + "...", kMessageLimit);
+  const std::string progressMessage = CutUtf8(
+      "Downloading " + (slash == std::string::npos ? source : source.substr(slash + 1)) + "...",
+      kMessageLimit);
 
   CurlHandles curl;
   if (curl.easy == nullptr || curl.multi == nullptr) {
@@ -278,6 +297,9 @@ int wxGet(DownloadProgress& dialog, int first, int last, const char* url, const 
   t.expected = expected;
   t.easy = curl.easy;
   t.targetPath = path ? path : "";
+
+  // Part files of transfers that were killed would stay beside it forever.
+  RemoveAbandonedPartFiles(t.targetPath);
 
   CURLcode result = CURLE_OK;
   long code = 0;
@@ -336,52 +358,26 @@ int wxGet(DownloadProgress& dialog, int first, int last, const char* url, const 
   }
 
   if (t.createFailed) {
-    t.DropTemp();
+    t.file.Remove();
     Error("ERROR: wxGet can't create file: ", t.targetPath);
     return 0;
   }
   // Nothing came back at all: no connection, no response, no such file.
   if (!t.aborted && result != CURLE_OK && !t.bodySeen && !(t.http && t.responseSeen && code != 0)) {
-    t.DropTemp();
+    t.file.Remove();
     Error("ERROR: wxGet can't initialize stream for ", source);
     return 0;
   }
   // The stream is there: an empty body still gives a file.
-  if (!t.aborted && t.file == nullptr && !t.OpenTemp()) {
+  if (!t.aborted && !t.file.IsOpen() && !t.OpenTemp()) {
     Error("ERROR: wxGet can't create file: ", t.targetPath);
     return 0;
   }
 
-  if (t.file && std::fclose(t.file) != 0) t.writeFailed = true;
-  t.file = nullptr;
-
-  curl_off_t announced = -1;
-  curl_easy_getinfo(t.easy, CURLINFO_CONTENT_LENGTH_DOWNLOAD_T, &announced);
-
-  bool complete = !t.aborted;
-  if (!t.aborted) {
-    if (t.writeFailed) {
-      Error("ERROR: wxGet can't write file: ", t.targetPath);
-      complete = false;
-    } else if (result != CURLE_OK) {
-      Error("ERROR: wxGet transfer failed for ", source + " (" + curl_easy_strerror(result) + ")");
-      complete = false;
-    } else if (t.http && code != 200) {
-      Error("ERROR: wxGet no document at ", source + " (HTTP " + std::to_string(code) + ")");
-      complete = false;
-    } else if (announced >= 0 && announced != t.count) {
-      Error("ERROR: wxGet incomplete transfer of ", source);
-      complete = false;
-    }
+  if (!t.aborted && IsComplete(t, result, code, source)) {
+    if (!t.file.MoveTo(t.targetPath)) Error("ERROR: wxGet can't create file: ", t.targetPath);
   }
-  if (complete && !t.tempPath.empty()) {
-    if (std::rename(t.tempPath.c_str(), t.targetPath.c_str()) != 0) {
-      Error("ERROR: wxGet can't create file: ", t.targetPath);
-      unlink(t.tempPath.c_str());
-    }
-    t.tempPath.clear();
-  }
-  t.DropTemp();
+  t.file.Remove();
 
   dialog.Update(last, "Loading Completed.");
   return static_cast<int>(std::min<std::int64_t>(t.count, INT_MAX));

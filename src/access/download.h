@@ -28,13 +28,21 @@ class DownloadProgress {
 // file cannot be set up.
 //
 // Redirections (301, 302, 303, 307, 308) are followed, at most ten in one
-// call and only to http or https.  The document is written to a temporary
-// file beside `path` and renamed into place only when the transfer is
-// complete: HTTP 200 (or a scheme other than HTTP), no transfer error, and
-// as many bytes as the Content-Length announced.  Otherwise the temporary
-// file is removed and an older copy under `path` stays.
+// call and only to http or https.  The document is written to a part file
+// beside `path` and renamed into place only when the transfer is complete:
+// HTTP 200 (or a scheme other than HTTP), no transfer error (without a
+// Content-Length, the connection ended cleanly), as many bytes as the
+// Content-Length announced, and for a `path` ending in ".pdf" a whole PDF
+// file.  Otherwise the part file is removed and an older copy under `path`
+// stays.  Part files beside `path` that killed transfers left are removed
+// first.
 int wxGet(DownloadProgress& dialog, int first, int last, const char* url, const char* path,
           int expected);
+
+// A document name as the path of a URL: "#", "?" and "%" are characters of
+// the name there, not the URL's fragment, query or escapes.  Every other
+// byte that may not stand in a URL wxGet escapes itself.
+std::string EscapeUrlPath(const std::string& name);
 
 // Time limits of a transfer.  Tests shorten them.
 struct DownloadLimits {

@@ -1,23 +1,23 @@
-// Opening a document: resolution, the document cache, the fetch from the
-// documentation server and the three ways of starting a viewer.
+// Opening a document, step by step: read the request (anchor, extension),
+// resolve the file, make sure it is on the local disk (document cache,
+// download), choose the viewer by the viewer rules, start it.
 #include "access/opendoc.h"
 
-#include <sys/stat.h>
-#include <unistd.h>
-
-#include <cerrno>
-#include <cstdio>
+#include <algorithm>
+#include <cstdint>
 #include <cstring>
+#include <optional>
 #include <string>
-#include <vector>
 
+#include "access/download.h"
 #include "access/services.h"
 #include "access/template.h"
-#include "platform/paths.h"
-#include "platform/profile.h"
-#include "text/text.h"
+#include "access/viewer_rules.h"
 #include "base/settings.h"
 #include "base/trace.h"
+#include "platform/files.h"
+#include "platform/paths.h"
+#include "platform/profile.h"
 #include "trovlib/trovlib.h"
 
 const char* DocumentServerURL = nullptr;
@@ -25,11 +25,10 @@ const char* const kDefaultDocumentServerURL = "https://docs.lomari.org";
 
 namespace {
 
-constexpr std::size_t kNameCapacity = 256;       // document name
-constexpr std::size_t kPathCapacity = 260;       // local and reader paths
-constexpr std::size_t kUrlCapacity = 512;        // server URL
+constexpr std::size_t kNameCapacity = 256;  // document name
+constexpr std::size_t kPathCapacity = 260;  // local paths
+constexpr std::size_t kUrlCapacity = 512;   // server URL
 constexpr std::size_t kExtensionCapacity = 32;
-constexpr int kExpectedSize = 16777216;          // what counts as the whole progress range
 constexpr const char* kCachePattern = "?<$VARTEX\\doc\\>";
 
 std::string& ServerURLStorage() {
@@ -49,26 +48,165 @@ bool LeavesDirectory(const std::string& name) {
   return false;
 }
 
-bool Exists(const std::string& path) {
-  struct stat st;
-  return stat(path.c_str(), &st) == 0;
-}
-
 bool TooLong(const std::string& text, std::size_t capacity, const char* what) {
   if (text.size() < capacity) return false;
   TraceMessage(what, text.c_str());
   return true;
 }
 
-// The command of the Acrobat route: the reader gets the destination through
-// its /A option, cut at the anchor's first blank.
-TemplateCommand AcrobatCommand(const std::string& reader, const std::string& anchor,
-                               const std::string& document) {
-  std::string destination = anchor.substr(0, anchor.find(' '));
-  TemplateCommand command;
-  command.commandLine = "\"" + reader + "\" /A \"" + destination + "\" \"" + document + "\"";
-  command.argv = {reader, "/A", destination, document};
-  return command;
+// Whether the path leads somewhere, links followed.
+bool Exists(const std::string& path) {
+  FileStamp stamp;
+  return StampOf(path, stamp);
+}
+
+bool IsLoadedCopy(const std::string& path) {
+  return Exists(path) && Check_Loaded_PDF(path.c_str());
+}
+
+// One call of OpenDocumentFile.
+struct Request {
+  std::string callerText;             // as given, anchor and all
+  std::string name;                   // without the anchor; the full path once resolved
+  std::optional<std::string> anchor;  // the caller's, or behind the name's first "#"
+  bool anchorFromName = false;
+  std::string extension;
+  std::string relativeName;  // the name before resolution
+  std::string cachePath;     // where a document of the server is kept; "" for others
+};
+
+// The anchor and the extension.  False when the request cannot name a file.
+bool ReadRequest(const char* fileName, const char* anchor, Request& request) {
+  request.callerText = fileName ? fileName : "";
+  request.name = request.callerText;
+  TraceMessage("Open document: ", request.name.c_str());
+  if (anchor != nullptr) {
+    request.anchor = anchor;  // a "#" in the name then stays part of it
+  } else if (std::size_t hash = request.name.find('#'); hash != std::string::npos) {
+    request.anchor = request.name.substr(hash + 1);
+    request.name.resize(hash);
+    request.anchorFromName = true;
+  }
+  if (TooLong(request.name, kNameCapacity, "ERROR: document name too long: ")) return false;
+  const std::size_t dot = request.name.rfind('.');
+  if (dot == std::string::npos) {
+    TraceMessage("ERROR: undefined type of file: ", request.callerText.c_str());
+    return false;
+  }
+  request.extension = request.name.substr(dot + 1, kExtensionCapacity - 1);
+  request.relativeName = request.name;
+  return true;
+}
+
+// An absolute name as it is, else the installed copy, else the place in the
+// document cache (`cachePath`).  False when the document cannot be had.
+bool ResolveDocument(Request& request) {
+  if (Is_Absolute_Path(request.name.c_str())) return true;
+  const std::string& relative = request.relativeName;
+  if (const char* found = TrovSearch(kDocumentationCategory, relative.c_str())) {
+    std::string path(found);
+    if (!Exists(path)) {
+      TraceMessage("ERROR: Not accessible the document: ", relative.c_str());
+      return false;
+    }
+    if (TooLong(path, kNameCapacity, "ERROR: document path too long: ")) return false;
+    request.name = Fix_Slashes(path);
+    TraceMessage("Openning document file: ", request.name.c_str());
+    return true;
+  }
+  if (LeavesDirectory(relative)) {
+    TraceMessage("ERROR: document name leaves the document cache: ", relative.c_str());
+    return false;
+  }
+  std::string cachePath = std::string(TrovFind(kCachePattern)) + relative;
+  Fix_Slashes(cachePath);
+  // The cache path becomes the document name, so it must fit that.
+  if (TooLong(cachePath, kNameCapacity, "ERROR: document path too long: ")) return false;
+  request.cachePath = cachePath;
+  return true;
+}
+
+// A complete copy in the document cache, fetched from the documentation
+// server when there is none yet.  False, after telling the user, when none
+// could be had.
+bool MakeLocal(AccessServices& services, Request& request) {
+  const std::string& relative = request.relativeName;
+  const std::string& cachePath = request.cachePath;
+  if (!IsLoadedCopy(cachePath)) {
+    TraceMessage("INFO: Loading file to ", cachePath.c_str());
+    Get_Doc_Server();
+    TraceMessage("INFO: Loading from Document Server: ", DocumentServerURL);
+    const std::string url = std::string(DocumentServerURL) + "/" + EscapeUrlPath(relative);
+    if (TooLong(url, kUrlCapacity, "ERROR: document server URL too long: ")) return false;
+    TraceMessage("INFO: Loading: ", url.c_str());
+    Make_File_Path(cachePath.c_str());
+
+    TraceMessage("INFO: Start Loading ...");
+    services.Download("Downloading " + relative + " ...", url, cachePath);
+    TraceMessage("INFO: End Loading ...");
+  }
+
+  TraceMessage("INFO: Checking Loaded file ...");
+  if (!IsLoadedCopy(cachePath)) {
+    Get_Doc_Server();
+    services.ShowError("Can't download document file '" + relative + "'\nfrom document server '" +
+                           DocumentServerURL + "'\n\nIt is probably internet error. Try later.",
+                       "Lomari Docuvane Error");
+    TraceMessage("ERROR: Not accessible the document: ", relative.c_str());
+    return false;
+  }
+  request.name = cachePath;
+  TraceMessage("Openning document file: ", request.name.c_str());
+  return true;
+}
+
+ViewerFacts FactsFor(AccessServices& services, const Request& request) {
+  ViewerFacts facts;
+  facts.document = request.name;
+  facts.extension = request.extension;
+  facts.anchor = request.anchor;
+  char value[kTemplateCapacity] = "";
+  GetPrivateProfileStringA("Extensions", request.extension.c_str(), "", value, sizeof value,
+                           IniFilePath.c_str());
+  facts.openingTemplate = value;
+  facts.root = RootPath;
+  facts.traceTemplates = TraceMode != 0;
+  facts.findReader = [&services, &request] { return services.FindExecutable(request.name); };
+  facts.findProgram = [](const std::string& program) {
+    const char* path = TrovSearch("Program", program.c_str());
+    return std::string(path ? path : "");
+  };
+  return facts;
+}
+
+// 1 when a command line was started, whatever became of it.
+int StartViewer(AccessServices& services, const Request& request, const ViewerChoice& choice) {
+  for (const auto& [text, argument] : choice.notes) TraceMessage(text.c_str(), argument.c_str());
+  switch (choice.route) {
+    case ViewerRoute::kRefused:
+      return 0;
+    case ViewerRoute::kDefaultApplication:
+      TraceMessage("INFO: wxLaunchDefaultApplication ", request.name.c_str());
+      if (!services.LaunchDefaultApplication(request.name)) {
+        const std::string shown =
+            request.anchorFromName ? request.name + "#" + *request.anchor : request.name;
+        TraceMessage("ERROR: undefined method to open document file: ", shown.c_str());
+      }
+      return 0;
+    case ViewerRoute::kRun:
+      break;
+  }
+  // A command that does not fit is not run at all: a cut one could name
+  // another file or drop the document.
+  const std::string& line = choice.command.commandLine;
+  if (TooLong(line, kCommandLineCapacity, "ERROR: command line too long: ")) return 0;
+  TraceMessage("Run: ", line.c_str());
+  const long result = services.Execute(choice.command.argv);
+  if (result <= 0) {
+    const std::string code = std::to_string(result);
+    TraceMessage("WARNING: execution failed with error code=", code.c_str());
+  }
+  return 1;
 }
 
 }  // namespace
@@ -90,37 +228,30 @@ bool Is_Absolute_Path(const char* name) {
 }
 
 bool Check_Loaded_PDF(const char* path) {
-  struct stat st;
-  if (path == nullptr || stat(path, &st) != 0) return false;
-  FILE* file = std::fopen(path, "rb");
-  if (file == nullptr) return false;
-  bool ok = false;
+  FileStamp stamp;
+  RandomAccessFile file;
+  if (path == nullptr || !StampOf(path, stamp) || !file.Open(path)) return false;
   char head[6];
-  if (std::fread(head, 1, sizeof head, file) == sizeof head && std::memcmp(head, "%PDF-1", 6) == 0) {
-    long size = static_cast<long>(st.st_size);
-    long n = size < 1024 ? size : 1024;
-    char tail[1024];
-    if (n >= 9 && std::fseek(file, size - n, SEEK_SET) == 0 &&
-        std::fread(tail, 1, static_cast<std::size_t>(n), file) == static_cast<std::size_t>(n)) {
-      for (long i = n - 9; i >= 0 && !ok; --i) ok = std::memcmp(tail + i, "startxref", 9) == 0;
-    }
-  }
-  std::fclose(file);
-  return ok;
+  if (!file.ReadAt(0, head, sizeof head) || std::memcmp(head, "%PDF-1", 6) != 0) return false;
+  const std::int64_t size = stamp.size;
+  const std::int64_t n = std::min<std::int64_t>(size, 1024);
+  char tail[1024];
+  if (n < 9 || !file.ReadAt(size - n, tail, static_cast<std::size_t>(n))) return false;
+  for (std::int64_t i = n - 9; i >= 0; --i)
+    if (std::memcmp(tail + i, "startxref", 9) == 0) return true;
+  return false;
 }
 
 int Make_Path(const char* directory) {
   if (directory == nullptr) return 1;
   std::string dir(directory);
   Fix_Slashes(dir);
-  struct stat st;
-  if (stat(dir.c_str(), &st) == 0 || mkdir(dir.c_str(), 0755) == 0) return 0;
+  FileStamp stamp;
+  if (StampOf(dir, stamp) || MakeDirectory(dir)) return 0;
   std::size_t cut = dir.rfind(kPathSeparator);
   if (cut == std::string::npos) return 1;
   if (Make_Path(dir.substr(0, cut).c_str()) != 0) return 1;
-  if (mkdir(dir.c_str(), 0755) == 0) return 0;
-  // Someone else may have made it meanwhile; that is just as good.
-  return errno == EEXIST && stat(dir.c_str(), &st) == 0 && S_ISDIR(st.st_mode) ? 0 : 1;
+  return MakeDirectory(dir) ? 0 : 1;
 }
 
 int Make_File_Path(const char* filePath) {
@@ -136,140 +267,10 @@ int Make_File_Path(const char* filePath) {
   return Make_Path(path.substr(0, cut).c_str());
 }
 
-int OpenDocumentFile(AccessServices& services, const char* fileName, const char* anchorArgument) {
-  const std::string callerText = fileName ? fileName : "";
-  std::string name = callerText;
-  TraceMessage("Open document: ", name.c_str());
-
-  // The anchor: the caller's, or what follows the first "#" of the name.
-  bool hasAnchor = anchorArgument != nullptr;
-  bool anchorFromName = false;
-  std::string anchor = hasAnchor ? anchorArgument : "";
-  if (!hasAnchor) {
-    std::size_t hash = name.find('#');
-    if (hash != std::string::npos) {
-      anchor = name.substr(hash + 1);
-      name.resize(hash);
-      hasAnchor = anchorFromName = true;
-    }
-  }
-  if (TooLong(name, kNameCapacity, "ERROR: document name too long: ")) return 0;
-
-  std::size_t dot = name.rfind('.');
-  if (dot == std::string::npos) {
-    TraceMessage("ERROR: undefined type of file: ", callerText.c_str());
-    return 0;
-  }
-  std::string extension = name.substr(dot + 1, kExtensionCapacity - 1);
-  const std::string relativeName = name;
-
-  if (!Is_Absolute_Path(name.c_str())) {
-    const char* found = TrovSearch(kDocumentationCategory, relativeName.c_str());
-    if (found != nullptr) {
-      std::string path(found);
-      if (access(path.c_str(), F_OK) != 0) {
-        TraceMessage("ERROR: Not accessible the document: ", relativeName.c_str());
-        return 0;
-      }
-      if (TooLong(path, kNameCapacity, "ERROR: document path too long: ")) return 0;
-      name = Fix_Slashes(path);
-      TraceMessage("Openning document file: ", name.c_str());
-    } else {
-      if (LeavesDirectory(relativeName)) {
-        TraceMessage("ERROR: document name leaves the document cache: ", relativeName.c_str());
-        return 0;
-      }
-      std::string cachePath = std::string(TrovFind(kCachePattern)) + relativeName;
-      Fix_Slashes(cachePath);
-      // The cache path becomes the document name, so it must fit that.
-      if (TooLong(cachePath, kNameCapacity, "ERROR: document path too long: ")) return 0;
-
-      if (!(Exists(cachePath) && Check_Loaded_PDF(cachePath.c_str()))) {
-        TraceMessage("INFO: Loading file to ", cachePath.c_str());
-        Get_Doc_Server();
-        TraceMessage("INFO: Loading from Document Server: ", DocumentServerURL);
-        std::string url = std::string(DocumentServerURL) + "/" + relativeName;
-        if (TooLong(url, kUrlCapacity, "ERROR: document server URL too long: ")) return 0;
-        TraceMessage("INFO: Loading: ", url.c_str());
-        Make_File_Path(cachePath.c_str());
-
-        TraceMessage("INFO: Start Loading ...");
-        services.Download("Downloading " + relativeName + " ...", url, cachePath);
-        TraceMessage("INFO: End Loading ...");
-      }
-
-      TraceMessage("INFO: Checking Loaded file ...");
-      if (!(Exists(cachePath) && Check_Loaded_PDF(cachePath.c_str()))) {
-        Get_Doc_Server();
-        services.ShowError("Can't download document file '" + relativeName +
-                               "'\nfrom document server '" + DocumentServerURL +
-                               "'\n\nIt is probably internet error. Try later.",
-                           "Lomari Docuvane Error");
-        TraceMessage("ERROR: Not accessible the document: ", relativeName.c_str());
-        return 0;
-      }
-      name = cachePath;
-      TraceMessage("Openning document file: ", name.c_str());
-    }
-  }
-
-  TraceMessage("Openning document type: ", extension.c_str());
-  TemplateCommand command;
-  bool haveCommand = false;
-
-  if (hasAnchor && CompareIgnoringCase(extension.c_str(), "PDF") == 0) {
-    std::string reader = services.FindExecutable(name);
-    if (!reader.empty() && TooLong(reader, kPathCapacity, "ERROR: PDF reader path too long: "))
-      reader.clear();
-    if (!reader.empty()) {
-      TraceMessage("PDF Reader: ", reader.c_str());
-      if (ContainsIgnoringCase(reader, "acro")) {
-        command = AcrobatCommand(reader, anchor, name);
-        haveCommand = true;
-      }
-    }
-  }
-
-  if (!haveCommand) {
-    char value[kTemplateCapacity] = "";
-    GetPrivateProfileStringA("Extensions", extension.c_str(), "", value, sizeof value,
-                             IniFilePath.c_str());
-    std::string tmpl(value);
-    if (!tmpl.empty()) {
-      if (TraceMode) TraceMessage("INFO: template(*) ", tmpl.c_str());
-      std::string expansion = ExpandTemplateRoot(tmpl, RootPath);
-      if (TraceMode) TraceMessage("INFO: template(=) ", expansion.c_str());
-      if (TooLong(expansion, kTemplateCapacity, "ERROR: opening template too long: ")) return 0;
-      if (!expansion.empty()) {
-        command = BuildTemplateCommand(
-            expansion, name, hasAnchor ? anchor.c_str() : nullptr,
-            [](const std::string& program) {
-              const char* path = TrovSearch("Program", program.c_str());
-              return std::string(path ? path : "");
-            },
-            TraceMode != 0);
-        haveCommand = true;
-      }
-    }
-  }
-
-  if (!haveCommand) {
-    TraceMessage("INFO: wxLaunchDefaultApplication ", name.c_str());
-    if (!services.LaunchDefaultApplication(name)) {
-      std::string shown = anchorFromName ? name + "#" + anchor : name;
-      TraceMessage("ERROR: undefined method to open document file: ", shown.c_str());
-    }
-    return 0;
-  }
-
-  // A command that does not fit is not run at all: a cut one could name
-  // another file or drop the document.
-  if (TooLong(command.commandLine, kCommandLineCapacity, "ERROR: command line too long: ")) return 0;
-  TraceMessage("Run: ", command.commandLine.c_str());
-  long result = services.Execute(command.argv);
-  if (result <= 0) {
-    std::string code = std::to_string(result);
-    TraceMessage("WARNING: execution failed with error code=", code.c_str());
-  }
-  return 1;
+int OpenDocumentFile(AccessServices& services, const char* fileName, const char* anchor) {
+  Request request;
+  if (!ReadRequest(fileName, anchor, request) || !ResolveDocument(request)) return 0;
+  if (!request.cachePath.empty() && !MakeLocal(services, request)) return 0;
+  TraceMessage("Openning document type: ", request.extension.c_str());
+  return StartViewer(services, request, ChooseViewer(FactsFor(services, request)));
 }

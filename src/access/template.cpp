@@ -1,8 +1,6 @@
 // Opening templates: expansion by the Root setting and the command grammar.
 #include "access/template.h"
 
-#include "base/trace.h"
-
 std::string ExpandTemplateRoot(const std::string& tmpl, const std::string& root) {
   std::string out;
   int used = 0;  // only two string arguments are supplied
@@ -88,7 +86,7 @@ class CommandBuilder {
 
 TemplateCommand BuildTemplateCommand(const std::string& expansion, const std::string& document,
                                      const char* anchor, const ProgramLookup& findProgram,
-                                     bool trace) {
+                                     TraceNotes* notes) {
   const bool hasAnchor = anchor != nullptr;
   const std::size_t dot = document.rfind('.');
   const std::string stem = dot == std::string::npos ? document : document.substr(0, dot);
@@ -98,7 +96,7 @@ TemplateCommand BuildTemplateCommand(const std::string& expansion, const std::st
   std::size_t i = 0;
   const std::size_t n = expansion.size();
   while (i < n) {
-    if (trace) TraceMessage("INFO: templ-sp: ", expansion.c_str() + i);
+    if (notes) notes->emplace_back("INFO: templ-sp: ", expansion.substr(i));
     const char c = expansion[i];
     const bool copying = hasAnchor || depth == 0;
     switch (c) {
@@ -130,8 +128,8 @@ TemplateCommand BuildTemplateCommand(const std::string& expansion, const std::st
         break;
       case '<': {
         const std::size_t close = expansion.find('>', i + 1);
-        std::string name = expansion.substr(i + 1, close == std::string::npos ? std::string::npos
-                                                                               : close - i - 1);
+        std::string name =
+            expansion.substr(i + 1, close == std::string::npos ? std::string::npos : close - i - 1);
         if (name.size() > kProgramNameCapacity - 1) name.resize(kProgramNameCapacity - 1);
         builder.Insert(findProgram ? findProgram(name) : std::string(), true);
         i = close == std::string::npos ? n : close + 1;
@@ -142,7 +140,7 @@ TemplateCommand BuildTemplateCommand(const std::string& expansion, const std::st
         ++i;
         break;
     }
-    if (trace) TraceMessage("INFO: templ-dp: ", builder.CommandLine().c_str());
+    if (notes) notes->emplace_back("INFO: templ-dp: ", builder.CommandLine());
   }
   return builder.Finish();
 }

@@ -5,9 +5,10 @@
 #include <cstddef>
 #include <functional>
 #include <string>
+#include <utility>
 #include <vector>
 
-constexpr std::size_t kTemplateCapacity = 64;     // 63 characters and the NUL
+constexpr std::size_t kTemplateCapacity = 64;      // 63 characters and the NUL
 constexpr std::size_t kCommandLineCapacity = 256;  // 255 characters and the NUL
 constexpr std::size_t kProgramNameCapacity = 32;   // 31 characters and the NUL
 
@@ -30,10 +31,13 @@ struct TemplateCommand {
 // Full path of a program named in a template, or "" when not found.
 using ProgramLookup = std::function<std::string(const std::string& name)>;
 
+// Trace lines kept for later, in order: text and argument of TraceMessage.
+using TraceNotes = std::vector<std::pair<std::string, std::string>>;
+
 // Reads `expansion` by the template grammar.  `document` is the full path of
-// the document; `anchor` is null when there is none.  With `trace`, every
-// step is traced as "INFO: templ-sp: " (rest of the template) and
+// the document; `anchor` is null when there is none.  With `notes`, every
+// step is noted as "INFO: templ-sp: " (rest of the template) and
 // "INFO: templ-dp: " (command line so far).
 TemplateCommand BuildTemplateCommand(const std::string& expansion, const std::string& document,
                                      const char* anchor, const ProgramLookup& findProgram,
-                                     bool trace);
+                                     TraceNotes* notes);
