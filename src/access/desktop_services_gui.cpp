@@ -11,6 +11,7 @@
 #include "access/download.h"
 #include "access/opendoc.h"
 #include "access/opendoc_gui.h"
+#include "base/busy.h"
 #include "text/wxtext_gui.h"
 #include "platform/findexec.h"
 #include "platform/winapi.h"
@@ -20,6 +21,7 @@ namespace {
 constexpr int kExpectedSize = 16777216;  // bytes that fill the progress range
 
 int AskUser(const std::string& message, const std::string& caption, long style) {
+  const BusyScope busy;
   const auto& hook = DesktopAccessServices::TestMessageBoxHook();
   if (hook) return hook(message, caption, style);
   return wxMessageBox(ToWx(message), ToWx(caption), style);
@@ -81,6 +83,7 @@ std::string DesktopAccessServices::FindExecutable(const std::string& path) {
 
 int DesktopAccessServices::Download(const std::string& message, const std::string& url,
                                     const std::string& path) {
+  const BusyScope busy;
   wxProgressDialog dialog("Lomari Docs", ToWx(message), 100, parent_,
                           wxPD_CAN_ABORT | wxPD_AUTO_HIDE | wxPD_ELAPSED_TIME | wxPD_ESTIMATED_TIME |
                               wxPD_REMAINING_TIME);

@@ -6,7 +6,9 @@
 
 #include <string>
 
-class CmdConnection : public wxConnection {
+#include "command/channel_gui.h"
+
+class CmdConnection : public ChannelConnection {
  public:
   const void* Request(const wxString& item, size_t* size = nullptr,
                       wxIPCFormat format = wxIPC_TEXT) override;
@@ -23,13 +25,19 @@ class MyClient : public wxClient {
  public:
   MyClient() = default;
   ~MyClient() override;
+  // `server` is the socket path.
+  wxConnectionBase* MakeConnection(const wxString& host, const wxString& server,
+                                   const wxString& topic) override;
   wxConnectionBase* OnMakeConnection() override;
 
   CmdConnection* m_commandConnection = nullptr;
+  // How the last MakeConnection went.
+  ChannelOpen m_lastOpen = ChannelOpen::kNoServer;
 };
 
 // Sends `command` to the running instance.  1 when a conversation was made
-// (whatever the execute gave), 0 when no server answered.
-int SendCommand(const char* command);
+// (whatever the execute gave), 0 when no server answered.  `delivered`, when
+// given, tells whether the instance took the command.
+int SendCommand(const char* command, bool* delivered = nullptr);
 // The same on a given socket path (tests, benchmarks).
-int SendCommand(const char* command, const std::string& socketPath);
+int SendCommand(const char* command, const std::string& socketPath, bool* delivered = nullptr);

@@ -1,18 +1,20 @@
-// The running instance's end of the command channel: a per-user Unix-domain
-// socket served with the framework's IPC classes.  A later start of the
-// program hands its command line over it (client_gui.h).
+// The running instance's end of the command channel.  A later start of the
+// program hands its command line over it (client_gui.h); the transport
+// under the conversations is channel_gui.h.
 #pragma once
 
-#include <sys/types.h>
 #include <wx/ipc.h>
 
 #include <functional>
+#include <memory>
 #include <set>
 #include <string>
 
+#include "command/channel_gui.h"
+
 class MyServer;
 
-class MyConnection : public wxConnection {
+class MyConnection : public ChannelConnection {
  public:
   explicit MyConnection(MyServer* server);
   ~MyConnection() override;
@@ -46,26 +48,23 @@ class MyServer : public wxServer {
   MyServer();
   ~MyServer() override;
 
-  // Listens on `socketPath` (a path: the framework would listen on a TCP
-  // port for a name without '/').  Removes what stands at the path first, so
+  // Listens on `socketPath` (a path: the framework would take a name
+  // without '/' for a TCP port).  Removes what stands at the path first, so
   // only the holder of the instance lock may call it.
   bool Create(const wxString& socketPath) override;
   wxConnectionBase* OnAcceptConnection(const wxString& topic) override;
 
   MyConnection* m_acceptedConnection = nullptr;
 
-  // Connection bookkeeping (MyConnection calls these).
-  void Forget(MyConnection* connection);
+  // Connection bookkeeping (MyConnection calls it).
   void Disconnected(MyConnection* connection);
-  bool Owns(const void* connection) const;
 
  private:
+  void Forget(MyConnection* connection);
+  void ForgetEnded();
+
   std::set<MyConnection*> connections_;
-  class SocketTimeouts;
-  SocketTimeouts* timeouts_ = nullptr;
-  // The socket file this server made, so that it never removes another's.
-  ino_t inode_ = 0;
-  dev_t device_ = 0;
+  std::unique_ptr<ChannelServer> channel_;
 };
 
 // The service name that messages carry.
@@ -73,25 +72,21 @@ extern const char* const kCommandService;  // "Lomari.DDE.Docuvane"
 extern const char* const kCommandTopic;    // "CommandLine"
 
 // "<runtime directory>/Lomari.DDE.Docuvane", or empty (with an "ERROR: "
-// message) when the runtime directory is refused.
+// message) when the runtime directory is refused: the channel is off.
 std::string CommandSocketPath();
-
-// Longest socket path the kernel takes (sun_path less its NUL).  Longer
-// paths would be cut by the framework into an abstract socket that every
-// local user can reach, so they are refused.
-constexpr std::size_t kMaxSocketPath = 107;
 
 // Starts the server on CommandSocketPath(); NULL when it cannot.
 MyServer* StartCommandServer();
 // The same on a given path (tests).
 MyServer* StartCommandServer(const std::string& socketPath);
 
-// What the server does with a received command; by default ProcessCommand
-// on the main frame's help panel.  Tests put their own here.
+// What the server does with a received command.  Start-up hands in the
+// main window's command processing; without a runner commands are dropped.
 using CommandRunner = std::function<void(const std::string& command)>;
 void SetCommandRunner(CommandRunner runner);
 
-// Commands that arrived while a modal dialog or a nested event loop ran
-// wait here until the main loop is idle again; at most this many.
+// Commands that arrive while the program is busy (a message box, a modal
+// dialog, a download, another command) wait here until the main loop is
+// idle again; at most this many.
 constexpr std::size_t kMaxDeferredCommands = 64;
 std::size_t DeferredCommandCount();

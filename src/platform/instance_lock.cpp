@@ -8,7 +8,7 @@
 #include <cerrno>
 #include <cstring>
 
-#include "platform/paths.h"
+#include "platform/files.h"
 
 InstanceLock::~InstanceLock() { Release(); }
 
@@ -16,9 +16,8 @@ bool InstanceLock::Create(const std::string& name, const std::string& directory)
   Release();
   another_ = false;
   error_.clear();
-  const std::string dir = directory.empty() ? RuntimeDirectory(&error_) : directory;
-  if (dir.empty()) return false;
-  path_ = dir + "/" + name + ".lock";
+  const std::string dir = directory.empty() ? HomeDirectory() : directory;
+  path_ = dir + "/." + name + ".lock";
 
   // O_CLOEXEC: a viewer started by the program must not inherit the lock and
   // keep it after the program ends.  O_NOFOLLOW: never lock through a link.

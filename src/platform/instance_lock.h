@@ -3,7 +3,9 @@
 
 #include <string>
 
-// An exclusive flock() on a file in the runtime directory.  The kernel drops
+// An exclusive flock() on a file in the user's home directory, beside the
+// framework's configuration store: every start of the user finds it there,
+// whatever its environment says of runtime directories.  The kernel drops
 // the lock when its holder ends in any way (SIGKILL included), so a lock
 // left by a dead instance never blocks the next start, whatever the file
 // holds.
@@ -14,7 +16,8 @@ class InstanceLock {
   InstanceLock(const InstanceLock&) = delete;
   InstanceLock& operator=(const InstanceLock&) = delete;
 
-  // Tries to take the lock `name` in `directory` (empty: RuntimeDirectory()).
+  // Tries to take the lock `name` in `directory` (empty: the home
+  // directory); the file is ".<name>.lock".
   // Returns true when this object holds it.  When the lock file cannot be
   // opened at all, false is returned with the reason in error();
   // IsAnotherRunning() then says false, so that the program still starts.

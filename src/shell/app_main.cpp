@@ -12,6 +12,8 @@
 #include <memory>
 #include <string>
 
+#include "base/settings.h"
+#include "base/trace.h"
 #include "command/client_gui.h"
 #include "command/command.h"
 #include "command/server_gui.h"
@@ -20,8 +22,6 @@
 #include "platform/winapi.h"
 #include "shell/app.h"
 #include "shell/log.h"
-#include "base/settings.h"
-#include "base/trace.h"
 #include "text/wxtext_gui.h"
 #include "trovlib/trovlib.h"
 #include "window/frame.h"
@@ -31,6 +31,12 @@
 namespace {
 
 const char* const kWindowName = "Docuvane";
+
+// How a later start ends: the framework's failure status (-1) when its
+// command reached the running instance, otherwise one a script can tell.
+constexpr unsigned kDeliveredStatus = 255;
+constexpr unsigned kNotDeliveredStatus = 1;
+constexpr unsigned kChannelOffStatus = 2;
 
 void Phase(const char* phase) { TraceMessage("Docuvane::OnInit --- ", phase); }
 
@@ -53,9 +59,9 @@ class MyApp : public wxApp {
 // clang-format off
 wxBEGIN_EVENT_TABLE(MyApp, wxApp)
 wxEND_EVENT_TABLE()
-// clang-format on
+    // clang-format on
 
-wxIMPLEMENT_APP_NO_MAIN(MyApp);
+    wxIMPLEMENT_APP_NO_MAIN(MyApp);
 
 bool MyApp::OnInit() {
   Phase("Start");
@@ -74,13 +80,32 @@ bool MyApp::OnInit() {
       BringWindowToTop(window);
       SetForegroundWindow(window);
     }
-    SendCommand(Command_Line(argc, argv));
+    const char* const command = Command_Line(argc, argv);
+    unsigned status = kDeliveredStatus;
+    const std::string socketPath = CommandSocketPath();
+    if (socketPath.empty()) {
+      // The running instance cannot serve a channel here either; a second
+      // window would be a second instance.
+      TrovMessage("ERROR: MyApp::OnInit ",
+                  (std::string("command channel off, command not delivered: ") + command).c_str(),
+                  5);
+      status = kChannelOffStatus;
+    } else {
+      bool delivered = false;
+      SendCommand(command, socketPath, &delivered);
+      if (!delivered) {
+        TrovMessage(
+            "ERROR: MyApp::OnInit ",
+            (std::string("command not delivered to the running instance: ") + command).c_str(), 5);
+        status = kNotDeliveredStatus;
+      }
+    }
     // Returning false makes the framework end the process with its failure
     // status (-1) after tearing the toolkit down, and that teardown loads
     // the toolkit's themes first: it costs a later start more than all it
     // has done so far.  The outcome is the same without it.
     std::fflush(nullptr);
-    ExitProcess(255);
+    ExitProcess(status);
   }
 
   wxInitAllImageHandlers();
@@ -101,10 +126,16 @@ bool MyApp::OnInit() {
   MyFrame* frame = new MyFrame(ToWx(AppTitle));
   MainFrame = frame;
   SetTopWindow(frame);
-  // The command channel reaches the frame through MainFrame: forget it
-  // when the frame goes.
+  // Forwarded commands go to the frame's help panel while the frame lives.
+  SetCommandRunner([frame](const std::string& command) {
+    if (frame->IsIconized()) frame->Iconize(false);
+    ProcessCommand(frame->m_helpPanel, command.c_str(), 1);
+  });
   frame->Bind(wxEVT_DESTROY, [frame](wxWindowDestroyEvent& event) {
-    if (event.GetEventObject() == frame) MainFrame = nullptr;
+    if (event.GetEventObject() == frame) {
+      MainFrame = nullptr;
+      SetCommandRunner({});
+    }
     event.Skip();
   });
 

@@ -1,29 +1,22 @@
-// Running the real program in a sandbox: its own HOME, runtime, cache and TeX
-// trees, and a message log per process.
+// The real program in a sandbox: own HOME, runtime, cache, TeX trees and logs.
 #pragma once
 
 #include <fcntl.h>
-#include <poll.h>
 #include <pwd.h>
 #include <signal.h>
 #include <spawn.h>
-#include <sys/socket.h>
 #include <sys/stat.h>
-#include <sys/un.h>
 #include <sys/wait.h>
 #include <unistd.h>
 
 #include <chrono>
 #include <cstdint>
-#include <cstring>
-#include <filesystem>
-#include <fstream>
 #include <functional>
-#include <string>
 #include <thread>
-#include <vector>
 
-#include "test_support.h"
+#include "command/wire.h"
+#include "platform/socket_posix.h"
+#include "test_support.h"  // also filesystem, fstream, string, vector
 
 namespace e2e {
 
@@ -43,7 +36,6 @@ struct LogLine {
 };
 using Log = std::vector<LogLine>;
 
-// Lines of this text (at this level, unless -1).
 inline int Count(const Log& log, const std::string& text, int level = -1) {
   int n = 0;
   for (const auto& l : log) n += l.text == text && (level < 0 || l.level == level);
@@ -54,8 +46,7 @@ inline bool HasPrefix(const Log& log, const std::string& start) {
     if (l.text.compare(0, start.size(), start) == 0) return true;
   return false;
 }
-// True when `wanted` appear in this order (other lines between).
-inline bool InOrder(const Log& log, const std::vector<std::string>& wanted) {
+inline bool InOrder(const Log& log, const std::vector<std::string>& wanted) {  // others between
   std::size_t next = 0;
   for (const auto& l : log) next += next < wanted.size() && l.text == wanted[next];
   return next == wanted.size();
@@ -65,12 +56,9 @@ inline std::string Describe(const Log& log) {
   for (const auto& l : log) out += std::to_string(l.level) + '\t' + l.text + '\n';
   return out;
 }
-
-inline sockaddr_un UnixAddress(const std::string& path) {
-  sockaddr_un address{};
-  address.sun_family = AF_UNIX;
-  std::strncpy(address.sun_path, path.c_str(), sizeof address.sun_path - 1);
-  return address;
+inline std::string FileText(const std::string& path) {
+  std::ifstream in(path, std::ios::binary);
+  return std::string(std::istreambuf_iterator<char>(in), std::istreambuf_iterator<char>());
 }
 
 struct Process {
@@ -78,23 +66,26 @@ struct Process {
   std::string log;  // its TROVLIB_LOG
   int status = -1;  // exit status (or 128 + signal) once ended
 
-  // Collects the process if it has ended; true while it runs.
-  bool Running() {
+  bool Running() {  // collects the process once it has ended
     int raw = 0;
     if (pid <= 0 || waitpid(pid, &raw, WNOHANG) == 0) return pid > 0;
     status = WIFEXITED(raw) ? WEXITSTATUS(raw) : 128 + WTERMSIG(raw);
     pid = -1;
     return false;
   }
-  // The exit status, -1 when it did not end in time.
-  int Wait(milliseconds limit = milliseconds(20000)) {
+  int Wait(milliseconds limit = milliseconds(20000)) {  // -1: not ended in time
     return WaitFor([&] { return !Running(); }, limit) ? status : -1;
   }
-  void Kill(int signal = SIGKILL) {
+  void Stop(int signal = SIGTERM) {
     if (Running()) kill(pid, signal);
     Wait();
   }
-  void Stop() { Kill(SIGTERM); }
+  std::string Output() const { return FileText(log + ".out"); }  // standard output and error
+  long PeakKiB() const {                                         // peak resident memory
+    const std::string status = FileText("/proc/" + std::to_string(pid) + "/status");
+    const std::size_t at = status.find("VmHWM:");
+    return at == std::string::npos ? 0 : std::atol(status.c_str() + at + 6);
+  }
   Log Lines() const {
     Log lines;
     std::ifstream in(log, std::ios::binary);
@@ -115,22 +106,19 @@ class Sandbox {
   }
   ~Sandbox() {
     for (const pid_t pid : started_)
-      if (waitpid(pid, nullptr, WNOHANG) == 0) {  // not collected: still ours
-        kill(pid, SIGKILL);
-        waitpid(pid, nullptr, 0);
-      }
+      if (waitpid(pid, nullptr, WNOHANG) == 0) kill(pid, SIGKILL), waitpid(pid, nullptr, 0);
   }
-
   const std::string& root() const { return dir_.path(); }
+  const std::string& home() const { return home_; }
   std::string runtimeDir() const { return runtime_ + "/lomari"; }
   std::string socketPath() const { return runtimeDir() + "/Lomari.DDE.Docuvane"; }
   std::string lockName() const {
     const passwd* entry = getpwuid(geteuid());
     return std::string("Lomari-Docuvane-") + (entry ? entry->pw_name : "");
   }
-  std::string lockPath() const { return runtimeDir() + "/" + lockName() + ".lock"; }
-
-  Process Start(const std::vector<std::string>& args) {
+  // `changes` to the environment are "NAME=value" (set) or "NAME" (left out).
+  Process Start(const std::vector<std::string>& args,
+                const std::vector<std::string>& changes = {}) {
     Process p;
     p.log = dir_ / ("log-" + std::to_string(started_.size()));
     // clang-format off
@@ -142,6 +130,12 @@ class Sandbox {
     // clang-format on
     for (const char* name : {"DISPLAY", "USER", "LOGNAME"})
       if (const char* v = std::getenv(name)) env.push_back(std::string(name) + "=" + v);
+    for (const std::string& change : changes) {
+      const std::string name = change.substr(0, change.find('=')) + "=";
+      for (auto it = env.begin(); it != env.end();)
+        it = it->compare(0, name.size(), name) == 0 ? env.erase(it) : it + 1;
+      if (change.find('=') != std::string::npos) env.push_back(change);
+    }
     std::vector<std::string> argv = {DOCUVANE_PROGRAM};
     argv.insert(argv.end(), args.begin(), args.end());
     posix_spawn_file_actions_t actions;
@@ -150,7 +144,7 @@ class Sandbox {
                                      O_WRONLY | O_CREAT | O_TRUNC, 0644);
     posix_spawn_file_actions_adddup2(&actions, 1, 2);
     if (posix_spawn(&p.pid, DOCUVANE_PROGRAM, &actions, nullptr, Pointers(argv).data(),
-                    Pointers(env).data()) != 0)
+                    Pointers(env).data()))
       p.pid = -1;
     posix_spawn_file_actions_destroy(&actions);
     started_.push_back(p.pid);
@@ -164,9 +158,9 @@ class Sandbox {
     return p;
   }
   // Runs a later start to its end (status -1: it hung).
-  Process Run(const std::vector<std::string>& args, milliseconds limit = milliseconds(20000)) {
-    Process p = Start(args);
-    p.Wait(limit);
+  Process Run(const std::vector<std::string>& args, const std::vector<std::string>& changes = {}) {
+    Process p = Start(args, changes);
+    p.Wait(milliseconds(30000));
     return p;
   }
 
@@ -184,50 +178,32 @@ class Sandbox {
   std::vector<pid_t> started_;
 };
 
-// The toolkit's IPC wire format spoken by hand, for what the program's own
-// client never does.
+// The toolkit's IPC wire format spoken by hand, as the program's client never would.
 class RawChannel {
  public:
-  static constexpr int kExecute = 1, kRequest = 2, kPoke = 3, kAdviseStart = 4, kAdviseStop = 7,
-                       kRequestReply = 8, kFail = 9, kConnect = 10, kDisconnect = 11;
-  static std::string Length(std::uint32_t n) {
-    std::string bytes;
-    for (int i = 0; i < 4; ++i) bytes.push_back(static_cast<char>(n >> (8 * i)));
-    return bytes;
+  static constexpr int kRequest = 2, kAdviseStart = 4, kRequestReply = 8, kFail = 9, kConnect = 10,
+                       kDisconnect = 11;
+  static std::string Length(std::uint32_t n) { return wire::Length(n); }
+  static std::string Text(const std::string& s) { return wire::Name(s); }
+  ~RawChannel() { Close(); }
+  bool Connect(const std::string& path) {
+    bool refused;
+    return (fd_ = ConnectTo(path, &refused, nullptr)) >= 0;
   }
-  static std::string Text(const std::string& s) { return Length(s.size()) + s; }
-
-  ~RawChannel() {
-    if (fd_ >= 0) close(fd_);
+  void Close() { fd_ = fd_ >= 0 ? close(fd_), -1 : -1; }
+  void Send(char code, const std::string& rest) { WriteAll(fd_, code + rest, 1000); }
+  int ReadByte() {  // one byte within 5 s; -1 on end, error or time-out
+    char b;
+    return WaitReadable(fd_, 5000) == 1 && ReadArrived(fd_, &b, 1) == 1 ? b & 0xFF : -1;
   }
-  // 0, or the error of connect().
-  int Connect(const std::string& path) {
-    fd_ = socket(AF_UNIX, SOCK_STREAM | SOCK_CLOEXEC, 0);
-    const sockaddr_un a = UnixAddress(path);
-    return connect(fd_, reinterpret_cast<const sockaddr*>(&a), sizeof a) == 0 ? 0 : errno;
-  }
-  void Send(char code, const std::string& rest) {
-    const std::string bytes = code + rest;
-    send(fd_, bytes.data(), bytes.size(), MSG_NOSIGNAL);
-  }
-  // One byte within 5 s; -1 on end, error or time-out.
-  int ReadByte() {
-    pollfd p{fd_, POLLIN, 0};
-    unsigned char b;
-    return poll(&p, 1, 5000) > 0 && recv(fd_, &b, 1, 0) == 1 ? b : -1;
-  }
-  // The server's answer to a conversation on `topic`.
-  int Open(const std::string& topic) {
-    Send(kConnect, Text(topic));
-    return ReadByte();
-  }
+  int Open(const std::string& topic) { return Send(kConnect, Text(topic)), ReadByte(); }
   // The answer code of a request; the reply's bytes go to `reply`.
-  int Request(const std::string& item, std::string* reply) {
-    Send(kRequest, Text(item) + '\1');
+  int Request(const std::string& item, std::string* reply, char format = 1) {
+    Send(kRequest, Text(item) + format);
     const int code = ReadByte();
-    if (code != kRequestReply) return code;
     std::uint32_t size = 0;
-    for (int i = 0, b = 0; i < 4 && (b = ReadByte()) >= 0; ++i) size |= std::uint32_t(b) << (8 * i);
+    for (int i = 0, b = 0; code == kRequestReply && i < 4 && (b = ReadByte()) >= 0; ++i)
+      size |= std::uint32_t(b) << (8 * i);
     for (int b = 0; reply->size() < size && (b = ReadByte()) >= 0;) reply->push_back(char(b));
     return code;
   }
