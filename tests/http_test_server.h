@@ -10,6 +10,8 @@
 #include <unistd.h>
 
 #include <cstdlib>
+#include <atomic>
+#include <chrono>
 #include <map>
 #include <mutex>
 #include <string>
@@ -30,6 +32,8 @@ struct HttpReply {
   long long cutAfter = -1;  // send only this many bytes of the body
   End end = kClose;         // what follows the body
   bool noLength = false;    // no Content-Length: the end of the connection ends the body
+  std::size_t pieceSize = 0;  // with pieceDelayMs: the body sent in pieces of this size
+  int pieceDelayMs = 0;
 };
 
 class HttpTestServer {
@@ -58,6 +62,7 @@ class HttpTestServer {
     std::lock_guard<std::mutex> lock(mutex_);
     routes_[target] = std::move(reply);
   }
+  int Requests() const { return requests_.load(); }  // received so far
   std::string Url(const std::string& target) const {
     return "http://127.0.0.1:" + std::to_string(port_) + target;
   }
@@ -74,6 +79,7 @@ class HttpTestServer {
     std::size_t first = request.find(' ');
     std::string target = request.substr(first + 1, request.find(' ', first + 1) - first - 1);
     HttpReply reply{404, "<html><body>no such document</body></html>"};
+    ++requests_;
     {
       std::lock_guard<std::mutex> lock(mutex_);
       if (routes_.count(target)) reply = routes_[target];
@@ -83,8 +89,15 @@ class HttpTestServer {
     if (!reply.noLength) out += "Content-Length: " + std::to_string(reply.body.size()) + "\r\n";
     out += "Connection: close\r\n\r\n" +
            reply.body.substr(0, reply.cutAfter < 0 ? std::string::npos : reply.cutAfter);
-    for (ssize_t sent = 0, at = 0; at < ssize_t(out.size()); at += sent)
-      if ((sent = send(fd, out.data() + at, out.size() - at, MSG_NOSIGNAL)) <= 0) return;
+    const std::size_t head = out.size() - std::min(out.size(), reply.body.size());
+    const std::size_t piece = reply.pieceSize ? reply.pieceSize : out.size();
+    for (ssize_t sent = 0, at = 0, end = 0; at < ssize_t(out.size()); at += sent) {
+      if (at >= end) {  // the next piece, after its pause
+        if (end > 0) std::this_thread::sleep_for(std::chrono::milliseconds(reply.pieceDelayMs));
+        end = at == 0 ? ssize_t(std::min(out.size(), head + piece)) : at + ssize_t(piece);
+      }
+      if ((sent = send(fd, out.data() + at, std::min<ssize_t>(end, out.size()) - at, MSG_NOSIGNAL)) <= 0) return;
+    }
     if (reply.end == HttpReply::kReset) {  // the close that follows sends a reset
       linger abort{1, 0};
       setsockopt(fd, SOL_SOCKET, SO_LINGER, &abort, sizeof abort);
@@ -97,6 +110,7 @@ class HttpTestServer {
 
   int listener_ = socket(AF_INET, SOCK_STREAM | SOCK_CLOEXEC, 0), port_ = 0;
   std::mutex mutex_;
+  std::atomic<int> requests_{0};
   std::map<std::string, HttpReply> routes_;
   std::thread thread_;
 };
