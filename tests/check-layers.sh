@@ -4,7 +4,8 @@
 # tools/) may use base and never the GUI toolkit; gui (src/window,
 # src/shell and every *_gui file) may use both.  Also fails when two folders
 # of src/ include each other, and when a file outside src/platform includes
-# a system header of the operating system.  Prints each offence; exits 1 on any.
+# a system header of the operating system (and in src/platform, when a file
+# that does is not named for its system: *_posix.cpp, *_x11.cpp, ...).  Prints each offence; exits 1 on any.
 set -u
 cd "$(dirname "$0")/.."
 awk '
@@ -17,8 +18,12 @@ function folder(path,  parts) { split(path, parts, "/"); return parts[1] == "src
 FNR == 1 { file = FILENAME }
 /^[ \t]*#[ \t]*include[ \t]*</ {
   if (layer(file) < 3 && $0 ~ /<wx\//) { print file ": includes the GUI toolkit: " $0; bad = 1 }
-  if (file !~ /^src\/platform\// && $0 ~ /<(unistd|fcntl|dirent|dlfcn|pwd|poll|spawn|signal|windows|shellapi)\.h>|<(sys|X11|gtk|gdk)\//) {
-    print file ": an operating-system header outside src/platform: " $0; bad = 1
+  if ($0 ~ /<(unistd|fcntl|dirent|dlfcn|pwd|poll|spawn|signal|windows|shellapi)\.h>|<(sys|X11|gtk|gdk)\//) {
+    if (file !~ /^src\/platform\//) {
+      print file ": an operating-system header outside src/platform: " $0; bad = 1
+    } else if (file ~ /\.cpp$/ && file !~ /_(posix|x11|gtk|win32)(_gui)?\.cpp$/) {
+      print file ": uses the operating system but is not named for it (*_posix.cpp, ...)"; bad = 1
+    }
   }
 }
 /^[ \t]*#[ \t]*include[ \t]*"/ {
