@@ -1,5 +1,5 @@
-// Shared pieces of the GUI tests: a TeX tree in a temporary directory, an
-// isolated environment, the real frame, and bounded waits for the event loop.
+// The GUI tests' fixture: a TeX tree in a temporary directory, an isolated
+// environment, the real frame, and bounded waits for the event loop.
 #pragma once
 
 #include <gtest/gtest.h>
@@ -11,11 +11,11 @@
 #include <memory>
 #include <thread>
 
+#include "base/settings.h"
 #include "catalogue/keywords.h"
 #include "catalogue/pool.h"
 #include "platform/profile.h"
-#include "base/settings.h"
-#include "test_support.h"  // also filesystem, fstream, optional, string, vector
+#include "test_support.h"
 #include "window/frame.h"
 #include "window/panel.h"
 #include "wordindex/locate.h"
@@ -43,10 +43,10 @@ inline void Flush() {
   for (int i = 0; i < 5; ++i) wxYield();
 }
 
-// The test tree.  INI documents Manuals>LaTeX>Guide (keyword \section with
-// two anchors), Manuals>LaTeX>Reference, Manuals>Fonts>Catalogue,
-// Help>Docuvane (keyword .LMR.Help); word index labels latex/base/sample.pdf,
-// fonts/fontguide.pdf, math/amsldoc.pdf.  PDFs open through a template.
+// Documents Manuals>LaTeX>Guide (keyword \section, two anchors),
+// Manuals>LaTeX>Reference, Manuals>Fonts>Catalogue, Help>Docuvane; index
+// labels latex/base/sample.pdf, fonts/fontguide.pdf, math/amsldoc.pdf.  PDFs
+// open through a template; the viewer and xdg-open record their arguments.
 class WindowTest : public ::testing::Test {
  protected:
   TempDir root;
@@ -68,23 +68,20 @@ class WindowTest : public ::testing::Test {
                             "docuvane/docuvane-help.pdf", "latex/base/sample.pdf",
                             "fonts/fontguide.pdf", "math/amsldoc.pdf"})
       root.Write(std::string("texmf/doc/") + doc, "%PDF-1.4\n%%EOF\n");
-    root.Write("texmf/Docuvane/Docuvane.ini",
-               "[Setup]\nTrace=0\n[DOC]\n"
+    root.Write("texmf/Docuvane/Docuvane.ini", "[Setup]\nTrace=0\n[DOC]\n"
                "Manuals>LaTeX>Guide=guide.pdf\nManuals>LaTeX>Reference=reference.pdf\n"
                "Manuals>Fonts>Catalogue=fontcat.pdf\nHelp>Docuvane=docuvane-help.pdf\n"
                "[Extensions]\npdf=<docuvane-test-viewer> ^.pdf #\n");
     root.Write("texmf/doc/latex/guide/guide.ddf", "[Keywords]\n\\section=sec:section#sec:headings");
     root.Write("texmf/doc/docuvane/docuvane-help.ddf", "[Keywords]\n.LMR.Help=help-start\n");
-    const std::string listing = root.Write("listing.txt",  // the '@' word is never listed
+    const std::string listing = root.Write("listing.txt",
         "\\section\tlatex/base/sample.pdf\t12 15\n" "\\section\tfonts/fontguide.pdf\t3\n"
         "\\sectionmark\tlatex/base/sample.pdf\t20\n" "{align}\tmath/amsldoc.pdf\t7\n"
         "\\alpha\tmath/amsldoc.pdf\t2\n" "\\@ifnextchar\tlatex/base/sample.pdf\t4\n"
         "\\begin\tlatex/base/sample.pdf\t1\n" "tabular\tlatex/base/sample.pdf\t9\n");
     std::filesystem::create_directories(texmf + "/Update");
-    const std::string mkindex =
-        DOCUVANE_MKINDEX " '" + listing + "' '" + texmf + "/Update/command.Index'";
-    ASSERT_EQ(std::system(mkindex.c_str()), 0);
-    // The viewer and the stand-in xdg-open record their names and arguments, a file per start.
+    ASSERT_EQ(std::system((DOCUVANE_MKINDEX " '" + listing + "' '" + texmf +
+                           "/Update/command.Index'").c_str()), 0);
     for (const std::string name : {"docuvane-test-viewer", "xdg-open"})
       std::filesystem::permissions(root.Write("bin/" + name,
           "#!/bin/sh\nf='" + root.path() + "/" + name + "-'$$\nprintf '%s\\n' " + name +
@@ -117,8 +114,7 @@ class WindowTest : public ::testing::Test {
   // The next use reads the configuration file of $HOME afresh.
   static void ReopenConfig() { delete wxConfigBase::Set(nullptr); }
 
-  // Builds the frame as start-up does and shows it.
-  void OpenFrame() {
+  void OpenFrame() {  // as start-up does
     Docuvane_Init(OpenInstalledWordIndex);
     frame = new MyFrame("Lomari Docuvane");
     frame->Show();

@@ -15,9 +15,9 @@
 #include <tuple>
 #include <vector>
 
+#include "base/settings.h"
 #include "fake_access_services.h"
 #include "platform/profile.h"
-#include "base/settings.h"
 #include "test_support.h"
 
 extern char** environ;

@@ -1,9 +1,7 @@
-// The word index: file reader, reference blocks, word list, keyword targets,
+// The word index: reader, reference blocks, word list, keyword targets,
 // finding the file, and the replay of the fuzz corpus.
 #include <gtest/gtest.h>
 
-#include <filesystem>
-#include <fstream>
 #include <iterator>
 #include <sstream>
 #include <tuple>
@@ -15,12 +13,11 @@
 #include "wordindex/index_writer.h"
 #include "wordindex/locate.h"
 
+namespace {
+
 using testing_support::MessageCapture;
 using testing_support::ScopedEnv;
-using testing_support::TempDir;
 using Bytes = std::vector<uint8_t>;
-
-namespace {
 
 Bytes BuildIndex(const std::string& listing, bool longForm = false) {
   WordIndexBuilder builder;
@@ -60,22 +57,17 @@ TEST_F(WordIndexTest, LookupAtGroupEdges) {
   ASSERT_TRUE(
       Open(BuildIndex("q\ta\t1\nAbc\ta\t2\nabc\ta\t3\nabd\ta\t4\naaa\ta\t5\nzzz\ta\t6\n"
                       "ABC\ta\t7\n\\begin\ta\t8\n")));
-  // word, its page or 0, what
-  const std::tuple<const char*, int, const char*> rows[] = {
-      {"q", 1, "only word of its group"},     {"p", 0, "before the only word"},
-      {"r", 0, "after the only word"},        {"ABC", 7, "first of its group"},
-      {"zzz", 6, "last of its group"},        {"abc", 3, "case-distinct neighbour"},
-      {"aBc", 0, "other capitals"},           {"abd", 4, "middle word"},
-      {"AAA", 0, "below every word"},         {"zzzz", 0, "length of an empty group"},
-      {"\\begi", 0, "empty group below max"}, {"\\begin", 8, "longest word"},
-      {"", 0, "shorter than the shortest"},   {"\\begins", 0, "longer than the longest"},
-  };
-  for (const auto& [word, page, what] : rows) {
+  const std::pair<const char*, int> rows[] = {
+      // word, its page or 0
+      {"q", 1},      {"p", 0},       {"r", 0},   {"ABC", 7},     {"zzz", 6},
+      {"abc", 3},    {"aBc", 0},     {"abd", 4}, {"AAA", 0},     {"zzzz", 0},
+      {"\\begi", 0}, {"\\begin", 8}, {"", 0},    {"\\begins", 0}};
+  for (const auto& [word, page] : rows) {
     std::vector<std::string> items;
     if (int32_t offset = FindIndexWord(word)) LoadWordReferences(offset, word, items);
-    EXPECT_EQ(Join(items), page ? "a#page=" + std::to_string(page) + " |" : "") << what;
+    EXPECT_EQ(Join(items), page ? "a#page=" + std::to_string(page) + " |" : "") << word;
   }
-  // A word whose block starts at the end of the file, or whose block header passes it.
+  // A block starting at the end of the file, or whose header passes it.
   Bytes bytes = BuildIndex("abc\tx.pdf\t7\n");
   for (uint32_t block : {44u, 41u, 40u}) {
     Set(bytes, 23, block, 4);
@@ -84,17 +76,20 @@ TEST_F(WordIndexTest, LookupAtGroupEdges) {
   }
 }
 
-TEST_F(WordIndexTest, LabelReadKeepsTheStreamPosition) {
+TEST_F(WordIndexTest, LabelReadKeepsTheStreamPositionAndTheRange) {
   ASSERT_TRUE(Open(BuildIndex("w\tdoc/first.pdf\t1\nx\tsecond.pdf\t2\n")));
   unsigned char header[4];
   ASSERT_TRUE(ReadIndexBytes(FindIndexWord("w"), header, 4));
   char label[kLabelBufferSize];
   EXPECT_EQ(ReadIndexLabel(2, label), 10);
   EXPECT_STREQ(label, "second.pdf");
-  EXPECT_EQ(fgetc(WordIndexHandle), 'w');  // the block's word, read on from before
-  // index, buffer size, label
-  const std::tuple<int, std::size_t, const char*> rows[] = {
-      {1, 256, "doc/first.pdf"}, {1, 4, "doc"}, {0, 256, ""}, {3, 256, ""}, {-1, 256, ""}};
+  EXPECT_EQ(fgetc(WordIndexHandle), 'w');                   // the block's word, read on from before
+  const std::tuple<int, std::size_t, const char*> rows[] = {// index, buffer size, label
+                                                            {1, 256, "doc/first.pdf"},
+                                                            {1, 4, "doc"},
+                                                            {0, 256, ""},
+                                                            {3, 256, ""},
+                                                            {-1, 256, ""}};
   for (const auto& [index, size, expected] : rows) {
     std::vector<char> buffer(size, 'z');
     EXPECT_EQ(ReadIndexLabel(index, buffer.data(), size), int(strlen(expected))) << index;
@@ -151,7 +146,7 @@ TEST_F(WordIndexTest, ReferenceBlocks) {
   const Bytes bare = BuildIndex(labels + "w\ta\t12 15\nw\tb\t\n");
   const std::string label(189, 'd');  // with "#page=1 22 ": 200 characters
   const Bytes cut = BuildIndex("w\t" + label + "\t1 22 333 4444\n");
-  // Its last block's size S claims 0xFFFFFF bytes: one entry and an odd byte follow.
+  // Its last block's size claims 0xFFFFFF bytes: one entry and an odd byte follow.
   const Bytes pastEnd = ReadFile(DOCUVANE_FUZZ_CORPUS "/wordindex/entries-past-end.Index");
   // what, index, bytes written over the block from its word on, items, message
   const std::tuple<const char*, const Bytes&, std::string, std::string, const char*> rows[] = {
@@ -165,7 +160,7 @@ TEST_F(WordIndexTest, ReferenceBlocks) {
       {"long label returning", longForm, "w\0\3\0\x0C\0\1\0\x0F\0\3"s,
        "a#page=12 |b#page=15 |a#page=2 |", ""},
       {"mismatched label", compact, "v", "", "ERROR: Mismatched References label: v"},
-      {"S past the end of the file", pastEnd, "", "x#page=9 |", "WARNING: References cut"},
+      {"size past the end of the file", pastEnd, "", "x#page=9 |", "WARNING: References cut"},
   };
   for (const auto& [what, index, patch, expected, message] : rows) {
     Bytes bytes = index;
@@ -186,34 +181,32 @@ TEST_F(WordIndexTest, ReferenceBlocks) {
     EXPECT_EQ(LoadWordReferences(at, "w", items) + items.size(), 0u) << at;
 }
 
-TEST_F(WordIndexTest, WordListSkipsAtWordsAndSorts) {
+TEST_F(WordIndexTest, WordListSkipsAtWordsSortsAndFinds) {
   WordListData data;
   EXPECT_EQ(Fill_WordIndex(data), 0);  // no index open
   ASSERT_TRUE(
       Open(BuildIndex("{align}\ta\t1\n\\alpha\ta\t1\n\\@ifnextchar\ta\t1\n\\section\ta\t1\n"
                       "zeta@\ta\t1\n{tabular}\ta\t1\n\\Beta\ta\t1\n\\\\\ta\t1\n{\ta\t1\n")));
-  const int commands = CommandWordCount, environments = EnvironmentWordCount;
+  CommandWordCount = EnvironmentWordCount = 0;
   ASSERT_EQ(Fill_WordIndex(data), 1);
-  EXPECT_EQ(CommandWordCount - commands, 4);
-  EXPECT_EQ(EnvironmentWordCount - environments, 3);
+  EXPECT_EQ(CommandWordCount, 4);
+  EXPECT_EQ(EnvironmentWordCount, 3);
   EXPECT_TRUE(messages.Contains("Skipped index word: \\@ifnextchar"));
   EXPECT_TRUE(messages.Contains("Skipped index word: zeta@"));
   EXPECT_NE(FindIndexWord("\\@ifnextchar"), 0);  // still there for lookups
-  // "{" and "\\" compare as "" and "\".
+  // "{" and "\\" compare as "" and "\"; marks and case aside, bytes unsigned.
   EXPECT_EQ(Join({data.Words.begin(), data.Words.end()}),
             "{|\\\\|{align}|\\alpha|\\Beta|\\section|{tabular}|");
-  // Marks and case aside, equal; bytes are unsigned; letters fold to lower case.
   const std::tuple<const char*, const char*, int> order[] = {
       {"\\alpha", "Alpha", 0}, {"\xE9", "z", 1}, {"[", "a", -1}};
   for (const auto& [a, b, sign] : order) {
     const int got = CompareIndexWords(a, b);
     EXPECT_EQ((got > 0) - (got < 0), sign) << a << " vs " << b;
   }
-
   const std::vector<const char*> words = {"{align}",   "\\alpha",   "\\Section", "\\section",
                                           "sectional", "{section}", "sec"};
-  // text, exact, row, what
   const std::tuple<const char*, int, int, const char*> find[] = {
+      // text, exact, row, what
       {"", 0, 0, "empty text: first row"},
       {"SEC", 0, 2, "prefix ignores case and the words' marks"},
       {"\\sec", 0, 2, "a backslash text matches backslash words only"},
@@ -241,8 +234,8 @@ TEST(KeywordTargetsTest, SingleTargetMissingDocumentAndTooLong) {
   AddKeywordTarget("\\long", "aaaaaaaaaa", 1);  // 128 characters
   AddKeywordTarget("\\fits", "aaaaaaaaa", 1);   // 127 characters
   const std::string fits = DocumentTable[1].Path + "#aaaaaaaaa";
-  // word, items, the single target
   const std::tuple<const char*, std::string, std::string> rows[] = {
+      // word, items, single
       {"{ALIGN}", "/d/amsldoc.pdf#eq|", "/d/amsldoc.pdf#eq"},
       {"\\bad", "/d/amsldoc.pdf#kept|", ""},
       {"\\long", "", ""},
@@ -262,27 +255,26 @@ TEST(KeywordTargetsTest, SingleTargetMissingDocumentAndTooLong) {
 }
 
 TEST(LocateWordIndexTest, UpdateFirstThenDocumentationNoLongPaths) {
-  TempDir tree;
+  testing_support::TempDir tree;
   // Roots whose Update/command.Index path is 255 and 256 bytes long.
   const std::string d255(255 - tree.path().size() - 1 - 21, 'd'), d256 = d255 + "d";
-  // what, TEXMF below the temporary directory, places of files, the place found, message
-  const std::tuple<const char*, std::string, std::vector<std::string>, const char*, const char*>
-      rows[] = {
-          {"both: the update files win", "a", {"Update", "doc/latex"}, "Update", ""},
-          {"only in the documentation", "b", {"doc/latex"}, "doc/latex", ""},
-          {"nowhere", "c", {}, nullptr, "Document Word Index File: NOT FOUND"},
-          {"path of 255 bytes", d255, {"Update"}, "Update", ""},
-          {"path of 256 bytes", d256, {"Update"}, nullptr, "ERROR: Word Index file path too long"},
-      };
-  for (const auto& [what, root, places, place, message] : rows) {
+  // TEXMF below the temporary directory, places of files, the place found, message
+  const std::tuple<std::string, std::vector<std::string>, const char*, const char*> rows[] = {
+      {"a", {"Update", "doc/latex"}, "Update", ""},
+      {"b", {"doc/latex"}, "doc/latex", ""},
+      {"c", {}, nullptr, "Document Word Index File: NOT FOUND"},
+      {d255, {"Update"}, "Update", ""},
+      {d256, {"Update"}, nullptr, "ERROR: Word Index file path too long"},
+  };
+  for (const auto& [root, places, place, message] : rows) {
     const std::string texmf = tree / root;
     for (const std::string& p : places) tree.Write(root + "/" + p + "/command.Index", "");
     ScopedEnv env("TEXMF", texmf), texdir("TEXDIR", std::nullopt);
     MessageCapture messages;
     WordIndexPath.clear();
     const std::string found = LocateWordIndex();
-    EXPECT_EQ(found, place ? texmf + "/" + place + "/command.Index" : "") << what;
-    EXPECT_TRUE(messages.Contains(place ? "Document Word Index File: " + found : message)) << what;
+    EXPECT_EQ(found, place ? texmf + "/" + place + "/command.Index" : "") << root.size();
+    EXPECT_TRUE(messages.Contains(place ? "Document Word Index File: " + found : message));
   }
 }
 
