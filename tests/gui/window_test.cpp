@@ -1,13 +1,19 @@
-// The main window on a test tree: catalogue tree, word list, status line,
-// geometry and sash kept in the configuration store, icon buttons.
+// The main window on the test tree, driven as a user drives it: catalogue
+// tree, word list and status line; geometry and sash kept; icon buttons;
+// typing fills the Locations list, a location is shown in the tree and
+// opened, so is a tree item; the buttons reach the window that handles them.
 #include <gtest/gtest.h>
 #include <wx/bmpbuttn.h>
 #include <wx/image.h>
 #include <wx/listbox.h>
+#include <wx/srchctrl.h>
 #include <wx/statusbr.h>
+#include <wx/timer.h>
 #include <wx/treectrl.h>
+#include <wx/uiaction.h>
 
 #include "gui_support.h"
+#include "window/about.h"
 #include "window/ids.h"
 #include "window/qlistbox.h"
 
@@ -42,10 +48,7 @@ TEST_F(WindowTest, ShowsCatalogueTreeWordListAndCounts) {
   EXPECT_TRUE(messages.Contains("WARNING: Skipped index word: \\@ifnextchar"));
   EXPECT_EQ(frame->GetStatusBar()->GetStatusText(0),
             "There are 7 documents including 4 TeX commands and 1 LaTeX environments.");
-  EXPECT_EQ(frame->GetIcons().GetIconCount(), 5u) << "the compiled-in icon, 16 to 256 pixels";
   EXPECT_FALSE(p->m_gotoButton->IsEnabled());
-  EXPECT_EQ(p->m_targetList->GetCount(), 0u);
-
   std::filesystem::remove(texmf + "/Update/command.Index");
   ReopenFrame();
   EXPECT_EQ(panel()->m_wordList->GetItemCount(), 0u) << "without a word index";
@@ -53,69 +56,41 @@ TEST_F(WindowTest, ShowsCatalogueTreeWordListAndCounts) {
             "There are 4 documents including 0 TeX commands and 0 LaTeX environments.");
 }
 
-TEST_F(WindowTest, GeometryIsRestoredClampedToTheScreenAndSaved) {
-  ASSERT_EQ(VirtualScreenSize(), wxSize(1600, 1200))
-      << "the tests expect run-with-display's screen";
-  const struct {
-    const char* what;
-    std::optional<wxRect> stored;  // DIPs
-    wxRect expected;
-  } rows[] = {
-      // clang-format off
-      {"first start: 50, 50, 800 x 600", std::nullopt, {50, 50, 800, 600}},
-      {"smaller than the default: the default", wxRect(100, 120, 600, 500), {100, 120, 800, 600}},
-      {"fits: kept", wxRect(200, 100, 1000, 700), {200, 100, 1000, 700}},
-      {"too wide: as wide as the screen, at 0", wxRect(300, 40, 3000, 700), {0, 40, 1600, 700}},
-      {"too tall: as tall as the screen, at 0", wxRect(10, 400, 900, 5000), {10, 0, 900, 1200}},
-      {"left of and above the screen: moved to 0", wxRect(-200, -30, 900, 650), {0, 0, 900, 650}},
-      {"past right and bottom: moved back", wxRect(1500, 1100, 800, 600), {800, 600, 800, 600}},
-      // clang-format on
+TEST_F(WindowTest, GeometryAndSashAreRestoredClampedToTheScreenAndSaved) {
+  ASSERT_EQ(VirtualScreenSize(), wxSize(1600, 1200)) << "run-with-display's screen";
+  const std::pair<std::optional<wxRect>, wxRect> rows[] = {
+      // stored, shown and saved (DIPs)
+      {std::nullopt, {50, 50, 800, 600}},
+      {wxRect(100, 120, 600, 500), {100, 120, 800, 600}},  // never smaller than the default
+      {wxRect(300, 40, 3000, 700), {0, 40, 1600, 700}},
+      {wxRect(10, 400, 900, 5000), {10, 0, 900, 1200}},
+      {wxRect(-200, -30, 900, 650), {0, 0, 900, 650}},
+      {wxRect(1500, 1100, 800, 600), {800, 600, 800, 600}},
   };
   const char* const keys[] = {"/MainWindow/x", "/MainWindow/y", "/MainWindow/w", "/MainWindow/h",
                               "/MainWindow/Max"};
   auto parts = [](const wxRect& r) { return std::vector<long>{r.x, r.y, r.width, r.height, 0}; };
-  for (const auto& row : rows) {
-    SCOPED_TRACE(row.what);
-    for (int i = 0; row.stored && i < 4; ++i)
-      wxConfigBase::Get()->Write(keys[i], parts(*row.stored)[i]);
+  for (const auto& [stored, expected] : rows) {
+    for (int i = 0; stored && i < 4; ++i) wxConfigBase::Get()->Write(keys[i], parts(*stored)[i]);
     ResetProgramState();
     OpenFrame();
-    EXPECT_EQ(frame->GetRect(), wxRect(frame->FromDIP(row.expected.GetPosition()),
-                                       frame->FromDIP(row.expected.GetSize())));
+    EXPECT_EQ(frame->GetRect(),
+              wxRect(frame->FromDIP(expected.GetPosition()), frame->FromDIP(expected.GetSize())));
     CloseFrame();
-    ReopenConfig();  // what closing wrote reached the file; the next row overwrites it
+    ReopenConfig();  // what closing wrote reached the file
     std::vector<long> saved;
     for (const char* key : keys) saved.push_back(wxConfigBase::Get()->ReadLong(key, -1));
-    EXPECT_EQ(saved, parts(row.expected));
+    EXPECT_EQ(saved, parts(expected));
   }
-}
-
-// Minimized and maximized need a window manager, which the test display lacks.
-TEST_F(WindowTest, ClosingStateDecidesWhatIsWritten) {
-  const struct {
-    const char* what;
-    bool iconized, maximized;
-    std::vector<long> stored;  // x, w and Max afterwards
-  } rows[] = {
-      {"normal: the whole geometry and Max = 0", false, false, {70, 900, 0}},
-      {"maximized: only Max = 1", false, true, {11, 811, 1}},
-      {"minimized: nothing", true, false, {11, 811, 5}},
-      {"minimized and maximized: nothing", true, true, {11, 811, 5}},
-  };
-  const char* const keys[] = {"/MainWindow/x", "/MainWindow/w", "/MainWindow/Max"};
-  const long before[] = {11, 811, 5};
+  // Minimized and maximized need a window manager, which the test display lacks.
   wxConfigBase* config = wxConfigBase::Get();
-  for (const auto& row : rows) {
-    SCOPED_TRACE(row.what);
-    for (int i = 0; i < 3; ++i) config->Write(keys[i], before[i]);
-    WriteFrameGeometry(config, row.iconized, row.maximized, wxPoint(70, 80), wxSize(900, 700));
-    std::vector<long> stored;
-    for (const char* key : keys) stored.push_back(config->ReadLong(key, -1));
-    EXPECT_EQ(stored, row.stored);
+  for (const auto& [iconized, maximized, max] :
+       {std::tuple{false, true, 1L}, std::tuple{true, false, 5L}, std::tuple{true, true, 5L}}) {
+    config->Write(keys[0], 11L), config->Write(keys[4], 5L);
+    WriteFrameGeometry(config, iconized, maximized, wxPoint(70, 80), wxSize(900, 700));
+    EXPECT_EQ(config->ReadLong(keys[0], -1), 11) << "maximized or minimized: no geometry";
+    EXPECT_EQ(config->ReadLong(keys[4], -1), max) << "minimized: nothing";
   }
-}
-
-TEST_F(WindowTest, SashPositionIsSavedAndRestoredInDips) {
   OpenFrame();
   EXPECT_EQ(panel()->GetSashPosition(), panel()->FromDIP(300)) << "first start";
   panel()->SetSashPosition(panel()->FromDIP(420));
@@ -125,47 +100,210 @@ TEST_F(WindowTest, SashPositionIsSavedAndRestoredInDips) {
 }
 
 TEST_F(WindowTest, IconFilesMakeSquarePictureButtons) {
-  const struct {
-    int id;
-    const char *label, *file;  // the icon file of the second start
-    bool picture, greyClear;   // a picture in the file; its light grey masked out
-  } buttons[] = {
-      {wxID_HELP, "&Help", "help-contents.png", true, false},
-      {ID_INTERNET, "&Internet", "internet-web-browser.bmp", true, true},
-      {wxID_ABOUT, "&About", "help-about.png", false, false},
-  };
+  OpenFrame();
+  EXPECT_EQ(wxDynamicCast(wxWindow::FindWindowById(wxID_HELP, frame), wxButton)->GetLabel(),
+            "&Help")
+      << "no icon file: a text button";
   wxImage image(16, 16);  // light grey with a red square in the middle
   image.SetRGB(wxRect(0, 0, 16, 16), 192, 192, 192);
   image.SetRGB(wxRect(4, 4, 8, 8), 200, 0, 0);
-  for (bool installed : {false, true}) {
-    SCOPED_TRACE(installed ? "with icon files" : "without icon files");
-    for (const auto& b : buttons) {
-      if (!installed) continue;
-      const std::string path =
-          root.Write("texmf/Docuvane/icons/" + std::string(b.file), "not a picture");
-      if (b.picture) { ASSERT_TRUE(image.SaveFile(path)); }
-    }
-    ReopenFrame();
-    const int h = panel()->m_gotoButton->GetSize().y;
-    for (const auto& b : buttons) {
-      SCOPED_TRACE(b.file);
-      auto* button = wxDynamicCast(wxWindow::FindWindowById(b.id, frame), wxButton);
-      ASSERT_NE(button, nullptr);
-      EXPECT_FALSE(button->GetToolTipText().empty());
-      auto* picture = wxDynamicCast(button, wxBitmapButton);
-      ASSERT_EQ(picture != nullptr, installed) << "a picture button exactly when the file exists";
-      if (!picture) {
-        EXPECT_EQ(button->GetLabel(), b.label);
-        continue;
-      }
-      EXPECT_EQ(button->GetSize(), wxSize(h, h));
-      const wxBitmap bitmap = picture->GetBitmapLabel();
-      ASSERT_EQ(bitmap.IsOk(), b.picture);
-      if (!b.picture) continue;
-      EXPECT_EQ(bitmap.ConvertToImage().IsTransparent(0, 0), b.greyClear) << "only BMP lose grey";
-      EXPECT_FALSE(bitmap.ConvertToImage().IsTransparent(8, 8));
-    }
+  // id, icon file, a picture in it, its light grey masked out
+  const std::tuple<int, const char*, bool, bool> buttons[] = {
+      {wxID_HELP, "help-contents.png", true, false},
+      {ID_INTERNET, "internet-web-browser.bmp", true, true},
+      {wxID_ABOUT, "help-about.png", false, false}};
+  for (const auto& [id, file, picture, greyClear] : buttons) {
+    const std::string path = root.Write("texmf/Docuvane/icons/" + std::string(file), "no picture");
+    ASSERT_TRUE(!picture || image.SaveFile(path));
   }
+  ReopenFrame();
+  const int h = panel()->m_gotoButton->GetSize().y;
+  for (const auto& [id, file, picture, greyClear] : buttons) {
+    auto* button = wxDynamicCast(wxWindow::FindWindowById(id, frame), wxBitmapButton);
+    ASSERT_NE(button, nullptr) << file;
+    EXPECT_FALSE(button->GetToolTipText().empty()) << file;
+    EXPECT_EQ(button->GetSize(), wxSize(h, h)) << file;
+    const wxBitmap bitmap = button->GetBitmapLabel();
+    ASSERT_EQ(bitmap.IsOk(), picture) << file;
+    EXPECT_TRUE(!picture || (bitmap.ConvertToImage().IsTransparent(0, 0) == greyClear &&
+                             !bitmap.ConvertToImage().IsTransparent(8, 8)))
+        << file << ": only BMP lose their grey";
+  }
+}
+
+class LookupTest : public WindowTest {
+ protected:
+  wxUIActionSimulator sim;
+  Docuvane* p = nullptr;
+
+  void SetUp() override {
+    WindowTest::SetUp();
+    if (HasFatalFailure()) return;
+    OpenFrame();
+    frame->Raise();
+    p = panel();
+  }
+  // Clicks a point of `window` (client coordinates; by default its middle).
+  void Click(wxWindow* window, wxPoint at = wxDefaultPosition, bool twice = false) {
+    if (at == wxDefaultPosition)
+      at = wxPoint(window->GetClientSize().x / 2, window->GetClientSize().y / 2);
+    sim.MouseMove(window->ClientToScreen(at));
+    Flush();
+    twice ? sim.MouseDblClick() : sim.MouseClick();
+    Flush();
+  }
+  void ClickLocation(int row, bool twice = false) {
+    for (int y = 1; y < p->m_targetList->GetClientSize().y; ++y)
+      if (p->m_targetList->HitTest(wxPoint(20, y)) == row)
+        return Click(p->m_targetList, wxPoint(20, y + 3), twice);
+    ADD_FAILURE() << "row " << row << " is not visible";
+  }
+  void DoubleClickItem(const wxString& text) {
+    p->m_tree->EnsureVisible(Item(text));
+    Flush();
+    wxRect rect;
+    ASSERT_TRUE(p->m_tree->GetBoundingRect(Item(text), rect, true)) << text;
+    Click(p->m_tree, rect.GetPosition() + rect.GetSize() / 2, true);
+  }
+  std::string Word() {
+    return p->m_wordList->GetString(p->m_wordList->GetSelection()).utf8_string();
+  }
+  Args Locations() {
+    Args items;
+    for (const wxString& s : p->m_targetList->GetStrings()) items.push_back(s.utf8_string());
+    return items;
+  }
+  wxTreeItemId Item(const wxString& text, wxTreeItemId parent = wxTreeItemId()) {
+    wxTreeItemIdValue cookie;
+    for (wxTreeItemId c =
+             p->m_tree->GetFirstChild(parent.IsOk() ? parent : p->m_tree->GetRootItem(), cookie);
+         c.IsOk(); c = p->m_tree->GetNextSibling(c)) {
+      if (p->m_tree->GetItemText(c) == text) return c;
+      if (const wxTreeItemId below = Item(text, c); below.IsOk()) return below;
+    }
+    return wxTreeItemId();
+  }
+  // Waits for the recorded starts (program name, then arguments) and forgets them.
+  std::vector<Args> Runs() {
+    WaitFor([&] { return !std::filesystem::is_empty(records); });
+    Flush();
+    std::vector<Args> runs;
+    for (const auto& entry : std::filesystem::directory_iterator(records)) {
+      std::ifstream in(entry.path());
+      runs.emplace_back();
+      for (std::string line; std::getline(in, line);) runs.back().push_back(line);
+      std::filesystem::remove(entry.path());
+    }
+    return runs;
+  }
+  // What a start of the viewer on `doc` (under doc/) with these further arguments records.
+  std::vector<Args> Viewer(const std::string& doc, Args more = {}) {
+    more.insert(more.begin(), {"docuvane-test-viewer", texmf + "/doc/" + doc});
+    return {more};
+  }
+};
+
+TEST_F(LookupTest, TypingSelectsTheWordAndFillsLocations) {
+  Click(p->m_search);
+  ASSERT_TRUE(sim.Text("\\sec"));
+  ASSERT_TRUE(WaitFor([&] { return p->m_targetList->GetCount() == 4; }));
+  EXPECT_EQ(Word(), "\\section");
+  // Keyword targets first, newest first, then the index pages.
+  const std::string guide = texmf + "/doc/latex/guide/guide.pdf";
+  const Args section{guide + "#sec:headings", guide + "#sec:section",
+                     "latex/base/sample.pdf#page=12 15 ", "fonts/fontguide.pdf#page=3 "};
+  EXPECT_EQ(Locations(), section);
+  EXPECT_EQ(p->m_targetList->GetSelection(), 0);
+  EXPECT_FALSE(p->m_gotoButton->IsEnabled()) << "row 0 is selected by the program, not the user";
+  const std::tuple<const char*, const char*, Args> rows[] = {
+      // text, word, locations
+      {"\\secx", "\\section", section},  // no word starts with it
+      {"", "\\section", section},
+      {"al", "{align}", {"math/amsldoc.pdf#page=7 "}},  // a leading backslash or brace skipped
+  };
+  for (const auto& [text, word, locations] : rows) {
+    p->m_search->SetValue(text);
+    Flush();
+    EXPECT_EQ(Word(), word) << text;
+    EXPECT_EQ(Locations(), locations) << text;
+  }
+  Click(p->m_wordList, wxPoint(30, p->m_wordList->RowHeight * 3 / 2));  // row 1: \alpha
+  ASSERT_TRUE(WaitFor([&] { return p->m_wordList->GetSelection() == 1; }));
+  EXPECT_EQ(Locations(), Args{"math/amsldoc.pdf#page=2 "});
+}
+
+TEST_F(LookupTest, ALocationIsBoldedInTheTreeAndOpensThroughTheTemplate) {
+  Show_Topic(p, "\\section", 0);
+  Flush();
+  bool frameSawGoTo = false;
+  frame->Bind(
+      wxEVT_BUTTON, [&](wxCommandEvent&) { frameSawGoTo = true; }, ID_GOTO);
+  auto select = [&](int row, const wxString& bold, const wxString& notBold) {
+    ClickLocation(row);
+    ASSERT_TRUE(WaitFor([&] { return p->m_targetList->GetSelection() == row; }));
+    EXPECT_TRUE(p->m_gotoButton->IsEnabled());
+    EXPECT_TRUE(p->m_tree->IsBold(Item(bold)));
+    EXPECT_FALSE(p->m_tree->IsBold(Item(notBold)));
+    EXPECT_EQ(p->m_tree->GetSelection(), Item(bold));
+  };
+  select(3, "fontguide.pdf", "Guide");  // an index location: its label's node
+  Click(p->m_gotoButton);
+  EXPECT_EQ(Runs(), Viewer("fonts/fontguide.pdf", {"page=3 "}));
+  select(1, "Guide", "fontguide.pdf");  // a keyword location: its document's node
+  ClickLocation(1, true);
+  EXPECT_EQ(Runs(), Viewer("latex/guide/guide.pdf", {"sec:section"}));
+  EXPECT_FALSE(frameSawGoTo) << "the panel handles \"&Go To\"";
+  p->m_search->SetValue("\\alpha");
+  Flush();
+  EXPECT_FALSE(p->m_tree->IsBold(Item("Guide")));
+  EXPECT_FALSE(p->m_gotoButton->IsEnabled());
+
+  HighlightDocument(p, "other.pdf#page=1");
+  EXPECT_FALSE(HighlightedItem.IsOk()) << "a document the table does not know";
+  HighlightDocument(p, "LATEX/Base/Sample.PDF");  // no '#': the whole text, case ignored
+  ASSERT_EQ(HighlightedItem, Item("sample.pdf"));
+  EXPECT_TRUE(p->m_tree->IsBold(Item("sample.pdf")));
+  Fill_Tree(p);  // deletes the bold item: the next lookup must not touch it
+  EXPECT_FALSE(HighlightedItem.IsOk());
+  Show_Topic(p, "\\section", 0);
+  EXPECT_EQ(p->m_targetList->GetCount(), 4u);
+}
+
+// Ends the About dialog's modal loop from inside it, once it is up.
+struct AboutCloser : wxTimer {
+  bool shown = false;
+  void Notify() override {
+    for (wxWindow* w : wxTopLevelWindows)
+      if (auto* about = dynamic_cast<AboutDlg*>(w); about && about->IsModal())
+        shown = true, about->EndModal(wxID_CANCEL);
+  }
+};
+
+TEST_F(LookupTest, TreeItemsAndButtonsOpenWhatTheyShow) {
+  MessageCapture messages;
+  DoubleClickItem("Reference");
+  EXPECT_EQ(Runs(), Viewer("latex/reference.pdf"));
+  DoubleClickItem("Manuals");  // a category opens nothing
+  ASSERT_TRUE(WaitFor([&] { return messages.Contains("Not found clicked document"); }));
+  EXPECT_TRUE(std::filesystem::is_empty(records));
+  p->m_tree->SelectItem(Item("Catalogue"));
+  wxCommandEvent open(wxEVT_BUTTON, ID_OPEN_DOC);
+  p->GetEventHandler()->ProcessEvent(open);
+  EXPECT_EQ(Runs(), Viewer("fonts/fontcat.pdf"));
+
+  Click(wxWindow::FindWindowById(wxID_HELP, frame));
+  EXPECT_EQ(Runs(), Viewer("docuvane/docuvane-help.pdf", {"help-start"}));
+  Click(wxWindow::FindWindowById(ID_INTERNET, frame));
+  EXPECT_EQ(Runs(), (std::vector<Args>{{"xdg-open", "http://127.0.0.1:9/docs/about.php"}}));
+  EXPECT_TRUE(messages.Contains("INFO: MyFrame::OnHelp") &&
+              messages.Contains("INFO: MyFrame::OnInternet"));
+  AboutCloser closer;
+  closer.Start(50);
+  Click(wxWindow::FindWindowById(wxID_ABOUT, frame));
+  EXPECT_TRUE(WaitFor([&] { return closer.shown; }));
+  closer.Stop();
+  Flush();
+  for (wxWindow* w : wxTopLevelWindows) EXPECT_EQ(dynamic_cast<AboutDlg*>(w), nullptr);
 }
 
 }  // namespace
