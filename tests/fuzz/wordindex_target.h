@@ -1,6 +1,5 @@
-// Fuzz target for the word index file: opened from the bytes, then every
-// reader runs over it (lookups, labels, reference blocks, the word list).
-// Shared by the libFuzzer driver and the corpus replay in the unit tests.
+// Fuzz target for the word index file, shared by the libFuzzer driver and the
+// corpus replay: opened from the bytes, then every reader runs over it.
 #pragma once
 
 #include <algorithm>
@@ -32,16 +31,14 @@ inline int FuzzWordIndexInput(const uint8_t* data, size_t size) {
     return 0;
   }
   FuzzCheck(WordIndexSize == static_cast<int64_t>(size));
-  // Every stored word (as a C string it may be shorter), some others, one
-  // from the data, and blocks at offsets the file does not point at.
+  // Every stored word, some others, one from the data, and blocks the file does not point at.
   std::vector<std::string> words = {"", "a", "\\section", "{align}", "abc"};
-  for (int L = MinWordLength; L <= MaxWordLength; ++L) {
+  for (int L = MinWordLength; L <= MaxWordLength; ++L)
     for (int64_t at = LengthOffsets[L]; at + L + 5 <= LengthOffsets[L + 1]; at += L + 5) {
       std::string word(static_cast<std::size_t>(L), '\0');
       FuzzCheck(ReadIndexBytes(at, &word[0], word.size()));
       words.push_back(word.c_str());
     }
-  }
   const char* middle = reinterpret_cast<const char*>(data) + size / 2;
   words.push_back(std::string(middle, std::min<std::size_t>(size - size / 2, 40)).c_str());
   for (const std::string& word : words)
@@ -49,20 +46,14 @@ inline int FuzzWordIndexInput(const uint8_t* data, size_t size) {
       FuzzCheckReferences(offset, word.c_str());
   FuzzCheckReferences(static_cast<int32_t>(size / 3), words.back().c_str());
   FuzzCheckReferences(static_cast<int32_t>(size) - 1, "");
-
-  for (int k = -1; k <= LabelCount + 1; ++k) {
-    // Every label whole; the cuts of small buffers only at the table's ends,
-    // which keeps a run cheap for files with thousands of labels.
-    const bool edge = k <= 2 || k >= LabelCount - 1;
+  for (int k = -1; k <= LabelCount + 1; ++k)  // small buffers only at the table's ends
     for (std::size_t bufferSize : {std::size_t{1}, std::size_t{5}, std::size_t{kLabelBufferSize}}) {
-      if (!edge && bufferSize != kLabelBufferSize) continue;
+      if (k > 2 && k < LabelCount - 1 && bufferSize != kLabelBufferSize) continue;
       std::vector<char> buffer(bufferSize + 1, 'Z');
       const int n = ReadIndexLabel(k, buffer.data(), bufferSize);
       FuzzCheck(buffer[bufferSize] == 'Z' && n >= 0 && static_cast<std::size_t>(n) < bufferSize &&
                 std::strlen(buffer.data()) == static_cast<std::size_t>(n));
     }
-  }
-
   WordListData list;
   FuzzCheck(Fill_WordIndex(list) == 1);
   for (std::size_t i = 0; i < list.Words.size(); ++i)

@@ -1,5 +1,5 @@
-// The GUI tests' fixture: a TeX tree in a temporary directory, an isolated
-// environment, the real frame, and bounded waits for the event loop.
+// The GUI tests' fixture: a TeX tree, an isolated environment, the real
+// frame, and bounded waits for the event loop.
 #pragma once
 
 #include <gtest/gtest.h>
@@ -87,17 +87,11 @@ class WindowTest : public ::testing::Test {
           "#!/bin/sh\nf='" + root.path() + "/" + name + "-'$$\nprintf '%s\\n' " + name +
           " \"$@\" > \"$f\"\nmv \"$f\" '" + records + "'\n"), std::filesystem::perms::owner_all);
     // clang-format on
-    std::filesystem::create_directories(home);
-    std::filesystem::create_directories(records);
-    ResetProgramState();
-    ReopenConfig();
+    std::filesystem::create_directories(home), std::filesystem::create_directories(records);
+    ResetProgramState(), ReopenConfig();
   }
 
-  void TearDown() override {
-    CloseFrame();
-    ReopenConfig();
-    ResetProgramState();
-  }
+  void TearDown() override { CloseFrame(), ReopenConfig(), ResetProgramState(); }
 
   // Empties the process-wide tables an earlier frame filled.
   static void ResetProgramState() {
@@ -122,18 +116,9 @@ class WindowTest : public ::testing::Test {
     Flush();
   }
 
-  void CloseFrame() {
-    delete frame;
-    frame = nullptr;
-    Flush();
-  }
+  void CloseFrame() { delete frame, frame = nullptr, Flush(); }
 
-  void ReopenFrame() {
-    CloseFrame();
-    ReopenConfig();
-    ResetProgramState();
-    OpenFrame();
-  }
+  void ReopenFrame() { TearDown(), OpenFrame(); }
 
   Docuvane* panel() const { return frame->m_helpPanel; }
 };

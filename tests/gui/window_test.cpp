@@ -1,19 +1,19 @@
 // The main window on the test tree, driven as a user drives it: catalogue
-// tree, word list and status line; geometry and sash kept; icon buttons;
-// typing fills the Locations list, a location is shown in the tree and
-// opened, so is a tree item; the buttons reach the window that handles them.
+// tree, word list and status line; geometry and sash kept; typing fills the
+// Locations list, a location is shown in the tree and opened, so is a tree
+// item; the buttons reach the window that handles them; programs start
+// with exactly their arguments; a download runs under a progress dialog.
 #include <gtest/gtest.h>
-#include <wx/bmpbuttn.h>
-#include <wx/image.h>
+#include <wx/button.h>
 #include <wx/listbox.h>
 #include <wx/srchctrl.h>
 #include <wx/statusbr.h>
-#include <wx/timer.h>
 #include <wx/treectrl.h>
 #include <wx/uiaction.h>
 
+#include "access/desktop_services_gui.h"
 #include "gui_support.h"
-#include "window/about.h"
+#include "http_test_server.h"
 #include "window/ids.h"
 #include "window/qlistbox.h"
 
@@ -82,53 +82,12 @@ TEST_F(WindowTest, GeometryAndSashAreRestoredClampedToTheScreenAndSaved) {
     for (const char* key : keys) saved.push_back(wxConfigBase::Get()->ReadLong(key, -1));
     EXPECT_EQ(saved, parts(expected));
   }
-  // Minimized and maximized need a window manager, which the test display lacks.
-  wxConfigBase* config = wxConfigBase::Get();
-  for (const auto& [iconized, maximized, max] :
-       {std::tuple{false, true, 1L}, std::tuple{true, false, 5L}, std::tuple{true, true, 5L}}) {
-    config->Write(keys[0], 11L), config->Write(keys[4], 5L);
-    WriteFrameGeometry(config, iconized, maximized, wxPoint(70, 80), wxSize(900, 700));
-    EXPECT_EQ(config->ReadLong(keys[0], -1), 11) << "maximized or minimized: no geometry";
-    EXPECT_EQ(config->ReadLong(keys[4], -1), max) << "minimized: nothing";
-  }
   OpenFrame();
   EXPECT_EQ(panel()->GetSashPosition(), panel()->FromDIP(300)) << "first start";
   panel()->SetSashPosition(panel()->FromDIP(420));
   ReopenFrame();
   EXPECT_EQ(wxConfigBase::Get()->ReadLong("/MainWindow/Splitter", -1), 420);
   EXPECT_EQ(panel()->GetSashPosition(), panel()->FromDIP(420));
-}
-
-TEST_F(WindowTest, IconFilesMakeSquarePictureButtons) {
-  OpenFrame();
-  EXPECT_EQ(wxDynamicCast(wxWindow::FindWindowById(wxID_HELP, frame), wxButton)->GetLabel(),
-            "&Help")
-      << "no icon file: a text button";
-  wxImage image(16, 16);  // light grey with a red square in the middle
-  image.SetRGB(wxRect(0, 0, 16, 16), 192, 192, 192);
-  image.SetRGB(wxRect(4, 4, 8, 8), 200, 0, 0);
-  // id, icon file, a picture in it, its light grey masked out
-  const std::tuple<int, const char*, bool, bool> buttons[] = {
-      {wxID_HELP, "help-contents.png", true, false},
-      {ID_INTERNET, "internet-web-browser.bmp", true, true},
-      {wxID_ABOUT, "help-about.png", false, false}};
-  for (const auto& [id, file, picture, greyClear] : buttons) {
-    const std::string path = root.Write("texmf/Docuvane/icons/" + std::string(file), "no picture");
-    ASSERT_TRUE(!picture || image.SaveFile(path));
-  }
-  ReopenFrame();
-  const int h = panel()->m_gotoButton->GetSize().y;
-  for (const auto& [id, file, picture, greyClear] : buttons) {
-    auto* button = wxDynamicCast(wxWindow::FindWindowById(id, frame), wxBitmapButton);
-    ASSERT_NE(button, nullptr) << file;
-    EXPECT_FALSE(button->GetToolTipText().empty()) << file;
-    EXPECT_EQ(button->GetSize(), wxSize(h, h)) << file;
-    const wxBitmap bitmap = button->GetBitmapLabel();
-    ASSERT_EQ(bitmap.IsOk(), picture) << file;
-    EXPECT_TRUE(!picture || (bitmap.ConvertToImage().IsTransparent(0, 0) == greyClear &&
-                             !bitmap.ConvertToImage().IsTransparent(8, 8)))
-        << file << ": only BMP lose their grey";
-  }
 }
 
 class LookupTest : public WindowTest {
@@ -183,23 +142,22 @@ class LookupTest : public WindowTest {
     }
     return wxTreeItemId();
   }
-  // Waits for the recorded starts (program name, then arguments) and forgets them.
-  std::vector<Args> Runs() {
+  // Waits for a recorded start and gives its program name and arguments.
+  Args Run() {
     WaitFor([&] { return !std::filesystem::is_empty(records); });
     Flush();
-    std::vector<Args> runs;
+    Args run;
     for (const auto& entry : std::filesystem::directory_iterator(records)) {
       std::ifstream in(entry.path());
-      runs.emplace_back();
-      for (std::string line; std::getline(in, line);) runs.back().push_back(line);
+      for (std::string line; std::getline(in, line);) run.push_back(line);
       std::filesystem::remove(entry.path());
     }
-    return runs;
+    return run;
   }
   // What a start of the viewer on `doc` (under doc/) with these further arguments records.
-  std::vector<Args> Viewer(const std::string& doc, Args more = {}) {
+  Args Viewer(const std::string& doc, Args more = {}) {
     more.insert(more.begin(), {"docuvane-test-viewer", texmf + "/doc/" + doc});
-    return {more};
+    return more;
   }
 };
 
@@ -248,10 +206,10 @@ TEST_F(LookupTest, ALocationIsBoldedInTheTreeAndOpensThroughTheTemplate) {
   };
   select(3, "fontguide.pdf", "Guide");  // an index location: its label's node
   Click(p->m_gotoButton);
-  EXPECT_EQ(Runs(), Viewer("fonts/fontguide.pdf", {"page=3 "}));
+  EXPECT_EQ(Run(), Viewer("fonts/fontguide.pdf", {"page=3 "}));
   select(1, "Guide", "fontguide.pdf");  // a keyword location: its document's node
   ClickLocation(1, true);
-  EXPECT_EQ(Runs(), Viewer("latex/guide/guide.pdf", {"sec:section"}));
+  EXPECT_EQ(Run(), Viewer("latex/guide/guide.pdf", {"sec:section"}));
   EXPECT_FALSE(frameSawGoTo) << "the panel handles \"&Go To\"";
   p->m_search->SetValue("\\alpha");
   Flush();
@@ -269,41 +227,61 @@ TEST_F(LookupTest, ALocationIsBoldedInTheTreeAndOpensThroughTheTemplate) {
   EXPECT_EQ(p->m_targetList->GetCount(), 4u);
 }
 
-// Ends the About dialog's modal loop from inside it, once it is up.
-struct AboutCloser : wxTimer {
-  bool shown = false;
-  void Notify() override {
-    for (wxWindow* w : wxTopLevelWindows)
-      if (auto* about = dynamic_cast<AboutDlg*>(w); about && about->IsModal())
-        shown = true, about->EndModal(wxID_CANCEL);
-  }
-};
-
 TEST_F(LookupTest, TreeItemsAndButtonsOpenWhatTheyShow) {
   MessageCapture messages;
   DoubleClickItem("Reference");
-  EXPECT_EQ(Runs(), Viewer("latex/reference.pdf"));
+  EXPECT_EQ(Run(), Viewer("latex/reference.pdf"));
   DoubleClickItem("Manuals");  // a category opens nothing
   ASSERT_TRUE(WaitFor([&] { return messages.Contains("Not found clicked document"); }));
   EXPECT_TRUE(std::filesystem::is_empty(records));
   p->m_tree->SelectItem(Item("Catalogue"));
   wxCommandEvent open(wxEVT_BUTTON, ID_OPEN_DOC);
   p->GetEventHandler()->ProcessEvent(open);
-  EXPECT_EQ(Runs(), Viewer("fonts/fontcat.pdf"));
+  EXPECT_EQ(Run(), Viewer("fonts/fontcat.pdf"));
 
   Click(wxWindow::FindWindowById(wxID_HELP, frame));
-  EXPECT_EQ(Runs(), Viewer("docuvane/docuvane-help.pdf", {"help-start"}));
+  EXPECT_EQ(Run(), Viewer("docuvane/docuvane-help.pdf", {"help-start"}));
   Click(wxWindow::FindWindowById(ID_INTERNET, frame));
-  EXPECT_EQ(Runs(), (std::vector<Args>{{"xdg-open", "http://127.0.0.1:9/docs/about.php"}}));
+  EXPECT_EQ(Run(), (Args{"xdg-open", "http://127.0.0.1:9/docs/about.php"}));
   EXPECT_TRUE(messages.Contains("INFO: MyFrame::OnHelp") &&
               messages.Contains("INFO: MyFrame::OnInternet"));
-  AboutCloser closer;
-  closer.Start(50);
-  Click(wxWindow::FindWindowById(wxID_ABOUT, frame));
-  EXPECT_TRUE(WaitFor([&] { return closer.shown; }));
-  closer.Stop();
-  Flush();
-  for (wxWindow* w : wxTopLevelWindows) EXPECT_EQ(dynamic_cast<AboutDlg*>(w), nullptr);
+}
+
+TEST(DesktopServices, ExecuteHandsOverEveryArgumentUnchangedAndDownloadsUnderTheDialog) {
+  TempDir dir;
+  const std::string record = dir / "record", touch = "touch " + dir / "SENTINEL";
+  const std::string recorder =
+      dir.Write("recorder", "#!/bin/sh\nfor a in \"$@\"; do printf '%s\\0' \"$a\"; done > '" +
+                                record + ".tmp'\nmv '" + record + ".tmp' '" + record + "'\n");
+  std::filesystem::permissions(recorder, std::filesystem::perms::owner_all);
+  const Args hostile = {"a\" --evil-opt=1 \"b",
+                        "$(" + touch + ")",
+                        "`" + touch + "`",
+                        ";" + touch,
+                        "|" + touch,
+                        "back\\slash",
+                        "-rf",
+                        "new\nline",
+                        "Gr\u00fc\u00dfe",
+                        "",
+                        "  blanks  "};
+  DesktopAccessServices services(nullptr);
+  Args argv{recorder};
+  argv.insert(argv.end(), hostile.begin(), hostile.end());
+  EXPECT_GT(services.Execute(argv), 0);
+  ASSERT_TRUE(WaitFor([&] { return std::filesystem::exists(record); }));
+  std::ifstream in(record, std::ios::binary);
+  Args received;
+  for (std::string arg; std::getline(in, arg, '\0');) received.push_back(arg);
+  EXPECT_EQ(received, hostile);
+  EXPECT_FALSE(std::filesystem::exists(dir / "SENTINEL"));
+  EXPECT_EQ(services.Execute({}), 0);
+  EXPECT_EQ(services.Execute({""}), 0) << "a template whose program was not found";
+  EXPECT_EQ(services.Execute({dir / "missing-viewer"}), 0);
+  testing_support::HttpTestServer server;
+  server.Route("/doc.pdf", {200, std::string(300000, 'd')});
+  EXPECT_EQ(services.Download("Downloading ...", server.Url("/doc.pdf"), dir / "doc.pdf"), 300000);
+  EXPECT_EQ(std::filesystem::file_size(dir / "doc.pdf"), 300000u);
 }
 
 }  // namespace

@@ -1,17 +1,11 @@
-// The docuvane-mkindex tool run as a process, and the sample TeX tree built
-// with the tools at build time.
+// The docuvane-mkindex tool, run as a process.
 #include <gtest/gtest.h>
 #include <sys/wait.h>
 
-#include <cstring>
 #include <iterator>
-#include <set>
-#include <sstream>
 #include <tuple>
 
-#include "platform/profile.h"
 #include "test_support.h"
-#include "wordindex/wordindex.h"
 
 namespace {
 
@@ -94,43 +88,6 @@ TEST(MkIndexTool, RefusesBadListingsAndFilesNamingTheLine) {
     const Result r = RunTool(dir, args);
     EXPECT_EQ(r.status, 1) << args;
     EXPECT_NE(r.err.find(message), std::string::npos) << r.err;
-  }
-}
-
-// Index labels and [DOC] files exist; each PDF's cross-reference table points at its objects.
-TEST(SampleTree, LabelsDocumentsAndCrossReferencesHold) {
-  const fs::path tree = DOCUVANE_SAMPLE_TEXMF;
-  if (!fs::exists(tree / "Update")) GTEST_SKIP() << "sample tree not built (docuvane_sample_tree)";
-  ASSERT_EQ(OpenWordIndex((tree / "Update" / "command.Index").c_str()), 1);
-  EXPECT_GE(LabelCount, 5);
-  for (int k = 1; k <= LabelCount; ++k) {
-    char label[kLabelBufferSize];
-    ReadIndexLabel(k, label);
-    EXPECT_TRUE(fs::is_regular_file(tree / "doc" / label)) << label;
-  }
-  CloseWordIndex();
-  std::set<std::string> names;
-  for (const auto& entry : fs::recursive_directory_iterator(tree / "doc")) {
-    names.insert(entry.path().filename().string());
-    if (entry.path().extension() != ".pdf") continue;
-    const std::string pdf = ReadAll(entry.path());
-    const std::size_t xref = std::stoul(pdf.substr(pdf.rfind("startxref\n") + 10));
-    std::istringstream table(pdf.substr(xref + 5));
-    int first = -1, count = 0;
-    std::string offset, generation, kind;
-    table >> first >> count >> offset >> generation >> kind;  // the free entry 0
-    ASSERT_TRUE(pdf.compare(xref, 5, "xref\n") == 0 && first == 0 && count > 3) << entry.path();
-    for (int object = 1; object < count && table >> offset >> generation >> kind; ++object) {
-      const std::string head = std::to_string(object) + " 0 obj";
-      EXPECT_EQ(pdf.substr(std::stoul(offset), head.size()), head) << entry.path();
-    }
-  }
-  const std::string ini = (tree / "Docuvane" / "Docuvane.ini").string();
-  char keys[4000], file[64];
-  ASSERT_GT(GetPrivateProfileStringA("DOC", nullptr, "", keys, sizeof keys, ini.c_str()), 0u);
-  for (const char* key = keys; *key; key += std::strlen(key) + 1) {
-    GetPrivateProfileStringA("DOC", key, "", file, sizeof file, ini.c_str());
-    EXPECT_EQ(names.count(file), 1u) << key << " = " << file;
   }
 }
 
