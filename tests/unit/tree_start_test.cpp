@@ -1,5 +1,4 @@
-// Opening a tree item's document, the server's start page, and the
-// desktop's file-type association.
+// The server's start page, and the desktop's file-type association.
 #include <gtest/gtest.h>
 #include <sys/stat.h>
 
@@ -8,8 +7,6 @@
 
 #include "access/opendoc.h"
 #include "access/start_page.h"
-#include "access/tree_activation.h"
-#include "catalogue/documents.h"
 #include "fake_access_services.h"
 #include "platform/findexec.h"
 #include "test_support.h"
@@ -20,40 +17,6 @@ using testing_support::FakeAccessServices;
 using testing_support::MessageCapture;
 using testing_support::ScopedEnv;
 using Args = std::vector<std::string>;
-
-TEST(TreeActivation, OpensTheFirstEntryOfTheItem) {
-  const int savedCount = DocumentCount;
-  const std::vector<DocumentEntry> saved(DocumentTable, DocumentTable + 3);
-  void* const guide = &DocumentTable[0];
-  void* const second = &DocumentTable[1];
-  DocumentTable[0] = DocumentTable[1] = DocumentEntry{};
-  DocumentTable[0].Path = "/d/guide.pdf";
-  DocumentTable[0].TreeItem = guide;
-  DocumentTable[1].Path = "/d/second.pdf#page=4";
-  DocumentTable[1].TreeItem = second;
-  DocumentTable[2] = DocumentTable[1];
-  DocumentTable[2].Path = "/d/shadowed.pdf";
-  const char* kNotFound = "ERROR: Docuvane::Open_Document --- Not found clicked document";
-  const std::tuple<void*, int, Args, const char*> rows[] = {
-      // item, count, opened, error
-      {guide, 3, {"/d/guide.pdf"}, ""},
-      {second, 3, {"/d/second.pdf"}, ""},  // the lower index wins; the anchor split off
-      {nullptr, 3, {}, "ERROR: Docuvane::Open_Document invalid wxTreeItemId"},
-      {&DocumentTable[5], 3, {}, kNotFound},  // a category item
-      {guide, 0, {}, kNotFound},
-  };
-  for (const auto& [item, count, opened, error] : rows) {
-    DocumentCount = count;
-    FakeAccessServices services;
-    MessageCapture capture;
-    EXPECT_EQ(OpenTreeDocument(services, item), 0);
-    EXPECT_EQ(services.defaultApplication, opened) << error;
-    EXPECT_EQ(capture.LevelOf("ERROR"), *error ? 5 : -1) << error;
-    EXPECT_TRUE(capture.Contains(error));
-  }
-  std::copy(saved.begin(), saved.end(), DocumentTable);
-  DocumentCount = savedCount;
-}
 
 TEST(StartPage, OpensAboutPageOrTellsTheUser) {
   const std::string p232(232, 'p');

@@ -20,28 +20,10 @@ using testing_support::ScopedEnv;
 using testing_support::TempDir;
 
 std::string OrNull(const char* s) { return s ? s : "(null)"; }
-
 std::string ReadAll(const std::string& path) {
   std::stringstream ss;
   ss << std::ifstream(path, std::ios::binary).rdbuf();
   return ss.str();
-}
-
-TEST(TrovVar, EnvironmentFirstThenDefaultsAsFindExpandsThem) {
-  ScopedEnv texmf("TEXMF", ""), texdir("TEXDIR", {}), vartex("VARTEX", {}), home("HOME", "/h"),
-      cache("XDG_CACHE_HOME", {}), server("DOCSERVER", {}), none("NO_SUCH_TROV_VARIABLE", {});
-  EXPECT_STREQ(TrovVar("TEXMF"), DOCUVANE_SAMPLE_TEXMF) << "empty counts as unset";
-  EXPECT_STREQ(TrovVar("TEXDIR"), DOCUVANE_SAMPLE_TEXMF);
-  EXPECT_STREQ(TrovVar("VARTEX"), "/h/.cache/lomari");
-  EXPECT_EQ(TrovVar("DOCSERVER"), nullptr);
-  ScopedEnv texmf2("TEXMF", "/one:/two"), cache2("XDG_CACHE_HOME", "/c");
-  EXPECT_STREQ(TrovVar("TEXDIR"), "/one:/two");
-  EXPECT_STREQ(TrovFind("?<$VARTEX\\doc\\>"), "/c/lomari/doc/");
-  EXPECT_STREQ(TrovFind("?<${VARTEX}/doc>"), "/c/lomari/doc/");
-  EXPECT_STREQ(TrovFind("?<$NO_SUCH_TROV_VARIABLE\\doc\\>"), "/doc/");
-  EXPECT_STREQ(TrovFind("?<$TEXMF/doc>"), "/one/doc/");
-  ScopedEnv slashed("TEXMF", "/first/:/second");
-  EXPECT_STREQ(TrovINIFile(1), "/first/lomari.ini");
 }
 
 TEST(TrovSearch, PatternsCategoriesNamesAndTheIndexBuiltOnce) {
@@ -93,25 +75,6 @@ TEST(TrovSearch, PatternsCategoriesNamesAndTheIndexBuiltOnce) {
   EXPECT_EQ(OrNull(TrovSearch(docs, "later.pdf")), dir / "A/doc/new/later.pdf");
 }
 
-TEST(TrovWindows, RegistryInTheRuntimeDirectory) {
-  TempDir dir;
-  ScopedEnv runtime("XDG_RUNTIME_DIR", dir.path());
-  MessageCapture capture;
-  EXPECT_EQ(TrovLookupWindow("Docuvane"), 0ul) << "nothing registered";
-  TrovPublishWindow("Docuvane", 0x3a00007ul);
-  EXPECT_EQ(ReadAll(dir / "lomari/window-Docuvane"), "60817415\n");
-  TrovPublishWindow("Docuvane", 42);
-  EXPECT_EQ(TrovLookupWindow("Docuvane"), 42ul) << "a later start replaces it";
-  TrovPublishWindow("../escape", 7);
-  EXPECT_FALSE(std::ifstream(dir / "escape").good()) << "names stay inside the directory";
-  EXPECT_EQ(TrovLookupWindow("../escape"), 7ul);
-  for (const char* junk : {"", "12abc", "-5", "99999999999999999999999"}) {
-    dir.Write("lomari/window-Junk", junk);
-    EXPECT_EQ(TrovLookupWindow("Junk"), 0ul) << "content '" << junk << "'";
-  }
-  EXPECT_TRUE(capture.messages().empty());
-}
-
 TEST(RuntimeDirectory, CreatedPrivateOrRefused) {
   TempDir dir;
   for (const std::string what : {"missing", "private", "0755", "a file", "a link"}) {
@@ -134,40 +97,25 @@ TEST(RuntimeDirectory, CreatedPrivateOrRefused) {
   }
 }
 
-TEST(TrovMessage, LogLinesWholeFromManyProcessesAndTheStandardErrorBound) {
+TEST(TrovMessage, LogLinesWholeFromManyProcesses) {
   TempDir dir;
-  {
-    ScopedEnv log("TROVLIB_LOG", dir / "trov.log"), quiet("TROVLIB_STDERR_LEVEL", "1000");
-    TrovMessage("ERROR: DDE client ", "no server", 5);
-    TrovMessage("INFO: x ", "two\nlines\r", 2);
-    TrovMessage(nullptr, "bare", 260);
-    EXPECT_EQ(ReadAll(dir / "trov.log"),
-              "5\tERROR: DDE client no server\n2\tINFO: x two lines \n260\tbare\n");
-    const std::string text(200, 'f');
-    for (int p = 0; p < 4; ++p)
-      if (fork() == 0) {
-        for (int i = 0; i < 300; ++i) TrovMessage("P ", text.c_str(), 1);
-        _exit(0);
-      }
-    while (wait(nullptr) > 0) continue;
-    std::istringstream in(ReadAll(dir / "trov.log"));
-    int count = 0;
-    for (std::string line; std::getline(in, line);) count += line == "1\tP " + text;
-    EXPECT_EQ(count, 1200) << "every line whole";
-  }
-  // The standard error bound, its level and whether a message of that level is shown.
-  const std::tuple<const char*, int, bool> rows[] = {
-      {nullptr, 3, false}, {nullptr, 4, true}, {"2", 2, true}, {"junk", 3, false}};
-  for (const auto& [bound, level, shown] : rows) {
-    ScopedEnv env("TROVLIB_STDERR_LEVEL", bound ? std::optional<std::string>(bound) : std::nullopt);
-    int saved = dup(2), fd = open((dir / "err").c_str(), O_WRONLY | O_CREAT | O_TRUNC, 0600);
-    dup2(fd, 2);
-    TrovMessage("WARNING: t ", "msg", level);
-    dup2(saved, 2);
-    close(fd), close(saved);
-    EXPECT_EQ(ReadAll(dir / "err"), shown ? "WARNING: t msg\n" : "")
-        << "bound " << OrNull(bound) << " level " << level;
-  }
+  ScopedEnv log("TROVLIB_LOG", dir / "trov.log"), quiet("TROVLIB_STDERR_LEVEL", "1000");
+  TrovMessage("ERROR: DDE client ", "no server", 5);
+  TrovMessage("INFO: x ", "two\nlines\r", 2);
+  TrovMessage(nullptr, "bare", 260);
+  EXPECT_EQ(ReadAll(dir / "trov.log"),
+            "5\tERROR: DDE client no server\n2\tINFO: x two lines \n260\tbare\n");
+  const std::string text(200, 'f');
+  for (int p = 0; p < 4; ++p)
+    if (fork() == 0) {
+      for (int i = 0; i < 300; ++i) TrovMessage("P ", text.c_str(), 1);
+      _exit(0);
+    }
+  while (wait(nullptr) > 0) continue;
+  std::istringstream in(ReadAll(dir / "trov.log"));
+  int count = 0;
+  for (std::string line; std::getline(in, line);) count += line == "1\tP " + text;
+  EXPECT_EQ(count, 1200) << "every line whole";
 }
 
 }  // namespace
