@@ -13,20 +13,21 @@
 
 namespace testing_support {
 
+struct NoCopy {
+  NoCopy() = default;
+  NoCopy(const NoCopy&) = delete;
+  NoCopy& operator=(const NoCopy&) = delete;
+};
+
 // A fresh directory, removed with its contents at the end.
-class TempDir {
+class TempDir : NoCopy {
  public:
   TempDir() {
     std::string name = (std::filesystem::temp_directory_path() / "docuvane-test-XXXXXX").string();
     if (mkdtemp(name.data()) == nullptr) std::abort();
     path_ = name;
   }
-  ~TempDir() {
-    std::error_code ec;
-    std::filesystem::remove_all(path_, ec);
-  }
-  TempDir(const TempDir&) = delete;
-  TempDir& operator=(const TempDir&) = delete;
+  ~TempDir() { std::filesystem::remove_all(path_, ec_); }
   const std::string& path() const { return path_; }
   std::string operator/(const std::string& rel) const { return path_ + "/" + rel; }
   // Writes a file, making its directories; returns its path.
@@ -39,18 +40,17 @@ class TempDir {
 
  private:
   std::string path_;
+  std::error_code ec_;
 };
 
 // Sets (nullopt: unsets) an environment variable while it lives.
-class ScopedEnv {
+class ScopedEnv : NoCopy {
  public:
   ScopedEnv(const char* name, std::optional<std::string> value) : name_(name) {
     if (const char* old = std::getenv(name)) old_ = old;
     Set(value);
   }
   ~ScopedEnv() { Set(old_); }
-  ScopedEnv(const ScopedEnv&) = delete;
-  ScopedEnv& operator=(const ScopedEnv&) = delete;
 
  private:
   void Set(const std::optional<std::string>& value) {
@@ -68,7 +68,7 @@ struct CapturedMessage {
 };
 
 // Collects every library message while it lives.
-class MessageCapture {
+class MessageCapture : NoCopy {
  public:
   MessageCapture() {
     TrovSetMessageSink([this](const char* prefix, const char* text, int level) {
@@ -76,8 +76,6 @@ class MessageCapture {
     });
   }
   ~MessageCapture() { TrovSetMessageSink({}); }
-  MessageCapture(const MessageCapture&) = delete;
-  MessageCapture& operator=(const MessageCapture&) = delete;
   const std::vector<CapturedMessage>& messages() const { return messages_; }
   void clear() { messages_.clear(); }
   bool Contains(const std::string& needle) const { return LevelOf(needle) != -1; }

@@ -29,15 +29,12 @@ int main(int argc, char** argv) {
   wxTheApp->SetVendorName("Lomari");
   delete wxLog::SetActiveTarget(new wxLogStderr);
   wxLog::SetLogLevel(wxLOG_Error);
-  wxSetAssertHandler([](const wxString& file, int line, const wxString& func, const wxString& cond,
+  wxSetAssertHandler([](const wxString& file, int line, const wxString&, const wxString& cond,
                         const wxString& msg) {
-    ADD_FAILURE_AT(static_cast<const char*>(file.utf8_str()), line)
-        << "wx assertion in " << func.utf8_str() << ": " << cond.utf8_str() << " "
-        << msg.utf8_str();
+    ADD_FAILURE_AT(file.utf8_str(), line) << "wx assertion " << cond << ": " << msg;
   });
   wxInitAllImageHandlers();
   const int result = RUN_ALL_TESTS();
-  std::fflush(stdout);  // no toolkit teardown: one stuck on the display server would hang ctest
-  std::fflush(stderr);
+  std::fflush(nullptr);  // no toolkit teardown: one stuck on the display server would hang ctest
   _exit(result);
 }

@@ -90,24 +90,16 @@ class WindowTest : public ::testing::Test {
     std::filesystem::create_directories(home), std::filesystem::create_directories(records);
     ResetProgramState(), ReopenConfig();
   }
-
   void TearDown() override { CloseFrame(), ReopenConfig(), ResetProgramState(); }
-
   // Empties the process-wide tables an earlier frame filled.
   static void ResetProgramState() {
-    CloseWordIndex();
-    WordIndexPath.clear();
-    KeywordListReset();
-    PoolReset();
+    CloseWordIndex(), WordIndexPath.clear(), KeywordListReset(), PoolReset();
     CommandWordCount = EnvironmentWordCount = 0;
-    HighlightedItem.Unset();
-    ProfileCacheClear();
-    TrovResetCaches();
+    HighlightedItem.Unset(), ProfileCacheClear(), TrovResetCaches();
   }
 
   // The next use reads the configuration file of $HOME afresh.
   static void ReopenConfig() { delete wxConfigBase::Set(nullptr); }
-
   void OpenFrame() {  // as start-up does
     Docuvane_Init(OpenInstalledWordIndex);
     frame = new MyFrame("Lomari Docuvane");
@@ -115,11 +107,8 @@ class WindowTest : public ::testing::Test {
     WaitFor([this] { return frame->IsShownOnScreen(); });
     Flush();
   }
-
   void CloseFrame() { delete frame, frame = nullptr, Flush(); }
-
   void ReopenFrame() { TearDown(), OpenFrame(); }
-
   Docuvane* panel() const { return frame->m_helpPanel; }
 };
 

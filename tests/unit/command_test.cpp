@@ -1,9 +1,7 @@
-// The command line and the command grammar.
+// The command grammar.
 #include "command/command.h"
 
 #include <gtest/gtest.h>
-
-#include <clocale>
 
 #include "base/settings.h"
 #include "catalogue/documents.h"
@@ -15,36 +13,6 @@ namespace {
 
 using testing_support::MessageCapture;
 using Calls = std::vector<std::string>;
-
-TEST(CommandLine, JoinsQuotesAndCuts) {
-  const struct {
-    std::vector<std::wstring> args;
-    std::string joined;
-    bool cut = false;
-    const char* locale = "C.UTF-8";
-  } rows[] = {
-      {{}, ""},
-      {{L"a", L"b c", L"", L"d"}, "a \"b c\"  d"},  // only blanks quote; empty adds its blank
-      {{L"\u00e9t\u00e9"}, "\xc3\xa9t\xc3\xa9"},    // in the locale's encoding
-      {{L"a\u4e2db"}, "a?b", false, "C"},
-      {{std::wstring(1024, L'a')}, std::string(1023, 'a'), true},
-      {{std::wstring(1022, L'a') + L"\u00e9"}, std::string(1022, 'a'), true},  // no split
-  };
-  const std::string old = std::setlocale(LC_CTYPE, nullptr);
-  for (const auto& row : rows) {
-    ASSERT_NE(std::setlocale(LC_CTYPE, row.locale), nullptr) << row.locale;
-    std::vector<const wchar_t*> argv = {L"docuvane"};
-    for (const auto& a : row.args) argv.push_back(a.c_str());
-    argv.push_back(nullptr);
-    MessageCapture capture;
-    EXPECT_EQ(Command_Line(static_cast<int>(argv.size() - 1), argv.data()), row.joined);
-    EXPECT_EQ(capture.LevelOf("WARNING: Command_Line "), row.cut ? 4 : -1) << row.joined;
-    ASSERT_FALSE(capture.messages().empty());
-    EXPECT_EQ(capture.messages().back().line(), "INFO: Command_Line - " + row.joined);
-    EXPECT_EQ(capture.messages().back().level, 2);
-  }
-  std::setlocale(LC_CTYPE, old.c_str());
-}
 
 // Records what ProcessCommand asks of the panel.
 class FakePanel : public CommandPanel {

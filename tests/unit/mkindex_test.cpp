@@ -42,8 +42,6 @@ TEST(MkIndexTool, WritesBothFormsAndDumpsThemBack) {
       44);
   ASSERT_EQ(RunTool(dir, "@one.listing @file.Index").status, 0);
   EXPECT_EQ(ReadAll(dir / "file.Index"), worked);
-  ASSERT_EQ(RunTool(dir, "- @stdin.Index <@one.listing").status, 0);
-  EXPECT_EQ(ReadAll(dir / "stdin.Index"), worked);
   dir.Write("in.listing",
             "\\section\tbase/usrguide.pdf\t12 15\r\n{align}\tamsldoc.pdf\t3\n\n"
             "\\section\tbase/clsguide.pdf\t4\n\\@ifnextchar\tbase/clsguide.pdf\t9 10\n");
@@ -57,7 +55,7 @@ TEST(MkIndexTool, WritesBothFormsAndDumpsThemBack) {
   }
 }
 
-TEST(MkIndexTool, RefusesBadListingsAndFilesNamingTheLine) {
+TEST(MkIndexTool, RefusesBadListingsNamingTheLine) {
   std::string labels;  // 8190 labels, the most an index holds
   for (int i = 1; i <= 8190; ++i) labels += "w\tdoc" + std::to_string(i) + ".pdf\t1\n";
   // listing, message (nullptr: accepted)
@@ -78,16 +76,6 @@ TEST(MkIndexTool, RefusesBadListingsAndFilesNamingTheLine) {
     EXPECT_EQ(r.status, message ? 1 : 0) << r.err;
     EXPECT_NE(r.err.find(message ? message : ""), std::string::npos) << r.err;
     EXPECT_TRUE(message || RunTool(dir, "--dump @out.Index").status == 0);  // it opens
-  }
-  TempDir dir;
-  dir.Write("junk.Index", "not an index");
-  dir.Write("bare.listing", "w\ta.pdf\t\n");  // a location without pages has no long form
-  for (const auto& [args, message] :
-       {std::pair{"--dump @junk.Index", "Invalid signature"},
-        std::pair{"--long @bare.listing @b.Index", "without pages"}}) {
-    const Result r = RunTool(dir, args);
-    EXPECT_EQ(r.status, 1) << args;
-    EXPECT_NE(r.err.find(message), std::string::npos) << r.err;
   }
 }
 

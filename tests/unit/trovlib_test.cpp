@@ -1,11 +1,9 @@
-// The path-search and message library and the runtime directory it relies on.
+// The path search and the runtime directory.
 #include "trovlib/trovlib.h"
 
 #include <fcntl.h>
 #include <gtest/gtest.h>
 #include <sys/stat.h>
-#include <sys/wait.h>
-#include <unistd.h>
 
 #include <sstream>
 #include <tuple>
@@ -20,50 +18,37 @@ using testing_support::ScopedEnv;
 using testing_support::TempDir;
 
 std::string OrNull(const char* s) { return s ? s : "(null)"; }
-std::string ReadAll(const std::string& path) {
-  std::stringstream ss;
-  ss << std::ifstream(path, std::ios::binary).rdbuf();
-  return ss.str();
-}
 
 TEST(TrovSearch, PatternsCategoriesNamesAndTheIndexBuiltOnce) {
   TempDir dir;  // two TeX trees, two icon themes and two PATH directories
   std::istringstream files(
-      "A/Docuvane/Docuvane.ini A/Docuvane/sub/deep.txt A/Update/command.Index A/doc/dup.pdf "
+      "A/Docuvane/Docuvane.ini A/Docuvane/sub/deep.txt A/doc/dup.pdf "
       "A/doc/latex/base/guide.pdf A/doc/context/guide.pdf A/doc/a/b/dup.pdf B/doc/only-b.pdf "
       "A/doc/xlatex/base/only.pdf A/Docuvane/logo.png B/Docuvane/logo.xpm bin1/data "
-      "A/Docuvane/icons/mine.png t1/32x32/apps/mine.png A/Docuvane/icons/24x24/sized.png "
-      "A/Docuvane/icons/16x16/sized.png t1/16x16/apps/x.png t1/24x24/apps/x.xpm "
-      "t1/22x22/apps/x.png t1/16x16/apps/small.ico t1/32x32/apps/small.png t1/32x32/apps/big.png "
-      "t1/48x48/apps/huge.png t2/24x24/apps/other.png t1/24x24/apps/dotted.name.png");
+      "t1/16x16/apps/x.png t1/24x24/apps/x.xpm t1/22x22/apps/x.png t1/16x16/apps/small.ico "
+      "t1/32x32/apps/small.png");
   for (std::string rel; files >> rel;) dir.Write(rel, "x");
   for (const char* rel : {"bin1/tool", "bin2/tool", "bin2/only"})
     chmod(dir.Write(rel, "").c_str(), 0755);
-  ScopedEnv texmf("TEXMF", dir / "A:" + dir / "B"), mine("MY_TREE", dir / "A/"),
-      path("PATH", dir / "bin1::" + dir / "bin2"),
+  ScopedEnv texmf("TEXMF", dir / "A:" + dir / "B"), path("PATH", dir / "bin1::" + dir / "bin2"),
       themes("TROVLIB_ICON_THEMES", dir / "t1:" + dir / "t2");
   const char* docs = "TeX system documentation";
   const std::tuple<const char*, std::string, const char*> rows[] = {
       // spec, name, found
       {"$TEXMF/Docuvane//", "Docuvane.ini", "A/Docuvane/Docuvane.ini"},
       {"${TEXMF}\\Docuvane\\\\", "deep.txt", "A/Docuvane/sub/deep.txt"},
-      {"$MY_TREE/Update", "command.Index", "A/Update/command.Index"},
       {docs, "only-b.pdf", "B/doc/only-b.pdf"},
       {docs, "dup.pdf", "A/doc/dup.pdf"},              // shallower path first
       {docs, "guide.pdf", "A/doc/context/guide.pdf"},  // same depth: byte order
       {docs, "latex\\base/guide.pdf", "A/doc/latex/base/guide.pdf"},
       {docs, "latex/base/only.pdf", nullptr},  // the tail matches whole steps
-      {"$TEXMF/Docuvane", "../Update/command.Index", nullptr},
+      {"$TEXMF/Docuvane", "../doc/dup.pdf", nullptr},
       {docs, dir / "A/doc/dup.pdf", "A/doc/dup.pdf"},
       {"Logo", "logo", "A/Docuvane/logo.png"},
       {"Program", "tool", "bin1/tool"},
-      {"Program", "data", nullptr},  // not executable
-      {"Icon", "mine", "A/Docuvane/icons/mine.png"},
+      {"Program", "data", nullptr},          // not executable
       {"Icon", "x", "t1/24x24/apps/x.xpm"},  // 24, 22, 16, whatever the extension
       {"Icon", "small", "t1/16x16/apps/small.ico"},
-      {"Icon", "huge", nullptr},
-      {"Icon", "other", "t2/24x24/apps/other.png"},
-      {"Icon", "dotted.name", nullptr},
   };
   for (const auto& [spec, name, found] : rows)
     EXPECT_EQ(OrNull(TrovSearch(spec, name.c_str())), found ? dir / found : "(null)")
@@ -95,27 +80,6 @@ TEST(RuntimeDirectory, CreatedPrivateOrRefused) {
     EXPECT_TRUE(!accepted || (lstat(path.c_str(), &st) == 0 && (st.st_mode & 0777) == 0700))
         << what;
   }
-}
-
-TEST(TrovMessage, LogLinesWholeFromManyProcesses) {
-  TempDir dir;
-  ScopedEnv log("TROVLIB_LOG", dir / "trov.log"), quiet("TROVLIB_STDERR_LEVEL", "1000");
-  TrovMessage("ERROR: DDE client ", "no server", 5);
-  TrovMessage("INFO: x ", "two\nlines\r", 2);
-  TrovMessage(nullptr, "bare", 260);
-  EXPECT_EQ(ReadAll(dir / "trov.log"),
-            "5\tERROR: DDE client no server\n2\tINFO: x two lines \n260\tbare\n");
-  const std::string text(200, 'f');
-  for (int p = 0; p < 4; ++p)
-    if (fork() == 0) {
-      for (int i = 0; i < 300; ++i) TrovMessage("P ", text.c_str(), 1);
-      _exit(0);
-    }
-  while (wait(nullptr) > 0) continue;
-  std::istringstream in(ReadAll(dir / "trov.log"));
-  int count = 0;
-  for (std::string line; std::getline(in, line);) count += line == "1\tP " + text;
-  EXPECT_EQ(count, 1200) << "every line whole";
 }
 
 }  // namespace

@@ -1,5 +1,4 @@
-// The word index: reader, reference blocks, word list, and the replay of the
-// fuzz corpus.
+// The word index: reader, reference blocks, and the replay of the fuzz corpus.
 #include <gtest/gtest.h>
 
 #include <iterator>
@@ -152,7 +151,6 @@ TEST_F(WordIndexTest, ReferenceBlocks) {
       {"compact label 0: its pages go too", compact, "w\x80\0\0\x0C"s, "b#page=2 |", "no label"},
       {"compact label above LabelCount", compact, "w\x80\x04"s, "b#page=2 |", "no label"},
       {"long label 0 first", longForm, "w\0\0\0\x0C"s, "a#page=15 |b#page=2 |", ""},
-      {"long label 32767", longForm, "w\0\3\0\x0C\x7F\xFF"s, "a#page=12 |b#page=2 |", "no label"},
       {"long label returning", longForm, "w\0\3\0\x0C\0\1\0\x0F\0\3"s,
        "a#page=12 |b#page=15 |a#page=2 |", ""},
       {"mismatched label", compact, "v", "", "ERROR: Mismatched References label: v"},
@@ -175,39 +173,6 @@ TEST_F(WordIndexTest, ReferenceBlocks) {
   std::vector<std::string> items;
   for (int32_t at : {33, 35, 36})  // the block header or its label runs past the end
     EXPECT_EQ(LoadWordReferences(at, "w", items) + items.size(), 0u) << at;
-}
-
-TEST_F(WordIndexTest, WordListSkipsAtWordsSortsAndFinds) {
-  WordListData data;
-  EXPECT_EQ(Fill_WordIndex(data), 0);  // no index open
-  ASSERT_TRUE(
-      Open(BuildIndex("{align}\ta\t1\n\\alpha\ta\t1\n\\@ifnextchar\ta\t1\n\\section\ta\t1\n"
-                      "zeta@\ta\t1\n{tabular}\ta\t1\n\\Beta\ta\t1\n\\\\\ta\t1\n{\ta\t1\n")));
-  CommandWordCount = EnvironmentWordCount = 0;
-  ASSERT_EQ(Fill_WordIndex(data), 1);
-  EXPECT_EQ(CommandWordCount, 4);
-  EXPECT_EQ(EnvironmentWordCount, 3);
-  EXPECT_TRUE(messages.Contains("Skipped index word: \\@ifnextchar"));
-  EXPECT_TRUE(messages.Contains("Skipped index word: zeta@"));
-  EXPECT_NE(FindIndexWord("\\@ifnextchar"), 0);  // still there for lookups
-  // "{" and "\\" compare as "" and "\"; marks and case aside; bytes unsigned.
-  EXPECT_EQ(Join({data.Words.begin(), data.Words.end()}),
-            "{|\\\\|{align}|\\alpha|\\Beta|\\section|{tabular}|");
-  EXPECT_GT(CompareIndexWords("\xE9", "z"), 0);
-  const std::vector<const char*> words = {"{align}",   "\\alpha",   "\\Section", "\\section",
-                                          "sectional", "{section}", "sec"};
-  const std::tuple<const char*, int, int, const char*> find[] = {
-      // text, exact, row, what
-      {"SEC", 0, 2, "prefix ignores case and the words' marks"},
-      {"{sec", 0, 5, "a brace text matches brace words only"},
-      {"section", 1, 3, "exact match, case included"},
-      {"sectio", 1, 2, "no exact match: first prefix"},
-      {"sec", 1, 6, "exact match after other prefixes"},
-      {"alpha}", 0, -1, "longer than every word"},
-  };
-  for (const auto& [text, exact, row, what] : find)
-    EXPECT_EQ(FindWordInList(words, text, exact), row) << what;
-  EXPECT_EQ(FindWordInList({}, "", 0), -1);
 }
 
 TEST(WordIndexFuzzReplay, EveryCorpusFileRunsCleanly) {
