@@ -5,6 +5,7 @@
 #include <cstdlib>
 #include <filesystem>
 #include <fstream>
+#include <iterator>
 #include <optional>
 #include <string>
 #include <vector>
@@ -16,7 +17,6 @@ namespace testing_support {
 struct NoCopy {
   NoCopy() = default;
   NoCopy(const NoCopy&) = delete;
-  NoCopy& operator=(const NoCopy&) = delete;
 };
 
 // A fresh directory, removed with its contents at the end.
@@ -60,6 +60,11 @@ class ScopedEnv : NoCopy {
   std::string name_;
   std::optional<std::string> old_;
 };
+
+inline std::string ReadAll(const std::filesystem::path& path) {
+  std::ifstream in(path, std::ios::binary);
+  return std::string(std::istreambuf_iterator<char>(in), std::istreambuf_iterator<char>());
+}
 
 struct CapturedMessage {
   std::string prefix, text;

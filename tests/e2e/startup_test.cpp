@@ -27,16 +27,14 @@ TEST(Startup, PhasesThenLaterStartsForwardAndEnd) {
   Sandbox box;
   Process first = box.StartInstance({"\\section"});
   ASSERT_TRUE(first.Running());
-  const std::vector<std::string> phases = {"Docuvane: Docuvane::OnInit --- Start",
-                                           "Docuvane: Docuvane::OnInit --- Names",
-                                           "Docuvane: Docuvane::OnInit --- pConfig",
-                                           "Docuvane: Docuvane::OnInit --- Command_Line",
-                                           "INFO: Command_Line - \\section",
-                                           "Docuvane: Docuvane::OnInit --- Frame ...",
-                                           "INFO: DDE server started Lomari.DDE.Docuvane",
-                                           "INFO: DDE server uses DDE",
-                                           "Docuvane: Docuvane::OnInit --- Parse_Command_Line",
-                                           "Docuvane: Search Keyword: \\section"};
+  // clang-format off
+  const std::vector<std::string> phases = {
+      "Docuvane: Docuvane::OnInit --- Start", "Docuvane: Docuvane::OnInit --- Names",
+      "Docuvane: Docuvane::OnInit --- pConfig", "Docuvane: Docuvane::OnInit --- Command_Line",
+      "INFO: Command_Line - \\section", "Docuvane: Docuvane::OnInit --- Frame ...",
+      "INFO: DDE server started Lomari.DDE.Docuvane", "INFO: DDE server uses DDE",
+      "Docuvane: Docuvane::OnInit --- Parse_Command_Line", "Docuvane: Search Keyword: \\section"};
+  // clang-format on
   Log log = first.Lines();
   EXPECT_TRUE(InOrder(log, phases)) << Describe(log);
   for (const auto& phase : phases) EXPECT_EQ(Count(log, phase), 1) << phase;
@@ -57,13 +55,9 @@ TEST(Startup, PhasesThenLaterStartsForwardAndEnd) {
                     "port=\"Lomari.DDE.Docuvane\" topic=\"CommandLine\" connected",
                     "INFO: DDE client Execute...", "INFO: DDE client disconnected from server"}))
       << Describe(own);
-  // No argument sends an empty command; a missing, dead or garbled window
-  // registration does not stop the forwarding.
-  const std::string registry = box.runtimeDir() + "/window-Docuvane";
-  for (const auto& [word, content] :
-       std::vector<std::pair<std::string, const char*>>{{"", nullptr}, {"dead", "4194303\n"}}) {
-    if (!word.empty()) std::filesystem::remove(registry);
-    if (content) std::ofstream(registry) << content;
+  // No argument sends an empty command; a dead window registration does not stop the forwarding.
+  for (const std::string word : {"", "dead"}) {
+    if (!word.empty()) std::ofstream(box.runtimeDir() + "/window-Docuvane") << "4194303\n";
     Process later = box.Run(word.empty() ? std::vector<std::string>{} : std::vector{word});
     EXPECT_EQ(later.status, 255) << word << Describe(later.Lines());
     EXPECT_TRUE(WaitFor([&] { return Count(first.Lines(), "INFO: DDE server Execute " + word); }))

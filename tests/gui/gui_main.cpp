@@ -1,5 +1,4 @@
-// Entry point of the GUI tests: the toolkit is initialised once, only its
-// errors are logged, and a failed assertion of the toolkit fails the test.
+// Entry point of the GUI tests: the toolkit once, only its errors logged, its assertions failures.
 #include <gtest/gtest.h>
 #include <unistd.h>
 #include <wx/app.h>
@@ -25,8 +24,7 @@ int main(int argc, char** argv) {
   }
   testing::InitGoogleTest(&argc, argv);
   if (!wxEntryStart(argc, argv)) return 1;
-  wxTheApp->SetAppName("Docuvane");
-  wxTheApp->SetVendorName("Lomari");
+  wxTheApp->SetAppName("Docuvane"), wxTheApp->SetVendorName("Lomari");
   delete wxLog::SetActiveTarget(new wxLogStderr);
   wxLog::SetLogLevel(wxLOG_Error);
   wxSetAssertHandler([](const wxString& file, int line, const wxString&, const wxString& cond,

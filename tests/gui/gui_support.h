@@ -8,7 +8,7 @@
 
 #include <chrono>
 #include <functional>
-#include <memory>
+#include <list>
 #include <thread>
 
 #include "base/settings.h"
@@ -29,14 +29,12 @@ using testing_support::ScopedEnv;
 using testing_support::TempDir;
 using Args = std::vector<std::string>;
 
-// Runs the event loop until `done` holds or `ms` milliseconds have passed.
-inline bool WaitFor(const std::function<bool()>& done, int ms = 5000) {
-  const auto end = std::chrono::steady_clock::now() + std::chrono::milliseconds(ms);
-  for (; !done(); std::this_thread::sleep_for(std::chrono::milliseconds(5))) {
-    if (std::chrono::steady_clock::now() > end) return false;
-    wxYield();
-  }
-  return true;
+// Runs the event loop until `done` holds or five seconds have passed.
+inline bool WaitFor(const std::function<bool()>& done) {
+  for (int i = 0; i < 1000;
+       ++i, wxYield(), std::this_thread::sleep_for(std::chrono::milliseconds(5)))
+    if (done()) return true;
+  return false;
 }
 
 inline void Flush() {
@@ -51,7 +49,7 @@ class WindowTest : public ::testing::Test {
  protected:
   TempDir root;
   const std::string texmf = root / "texmf", home = root / "home", records = root / "records";
-  std::vector<std::unique_ptr<ScopedEnv>> env;
+  std::list<ScopedEnv> env;
   MyFrame* frame = nullptr;
 
   void SetUp() override {
@@ -63,7 +61,7 @@ class WindowTest : public ::testing::Test {
         {"XDG_DATA_DIRS", root / "data:/usr/local/share:/usr/share"},
         {"PATH", root / "bin:/usr/bin:/bin"}, {"TROVLIB_ICON_THEMES", ""},
         {"DOCSERVER", "http://127.0.0.1:9/docs"}};
-    for (const auto& [name, value] : vars) env.push_back(std::make_unique<ScopedEnv>(name, value));
+    for (const auto& [name, value] : vars) env.emplace_back(name, value);
     for (const char* doc : {"latex/guide/guide.pdf", "latex/reference.pdf", "fonts/fontcat.pdf",
                             "docuvane/docuvane-help.pdf", "latex/base/sample.pdf",
                             "fonts/fontguide.pdf", "math/amsldoc.pdf"})
@@ -91,14 +89,13 @@ class WindowTest : public ::testing::Test {
     ResetProgramState(), ReopenConfig();
   }
   void TearDown() override { CloseFrame(), ReopenConfig(), ResetProgramState(); }
-  // Empties the process-wide tables an earlier frame filled.
+  // Empties the process-wide tables an earlier frame filled; the configuration is read afresh.
   static void ResetProgramState() {
     CloseWordIndex(), WordIndexPath.clear(), KeywordListReset(), PoolReset();
     CommandWordCount = EnvironmentWordCount = 0;
     HighlightedItem.Unset(), ProfileCacheClear(), TrovResetCaches();
   }
 
-  // The next use reads the configuration file of $HOME afresh.
   static void ReopenConfig() { delete wxConfigBase::Set(nullptr); }
   void OpenFrame() {  // as start-up does
     Docuvane_Init(OpenInstalledWordIndex);

