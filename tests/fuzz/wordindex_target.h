@@ -39,7 +39,8 @@ inline int FuzzWordIndexInput(const uint8_t* data, size_t size) {
     std::vector<char> buffer(n + 1, 'Z');
     const int length = ReadIndexLabel(k, buffer.data(), n);
     FuzzCheck(buffer[n] == 'Z' && length >= 0 && std::size_t(length) < n &&
-              std::strlen(buffer.data()) == std::size_t(length));
+              std::strlen(buffer.data()) == std::size_t(length) &&
+              (length == 0 || (k >= 1 && k <= LabelCount)));
   }
   WordListData list;
   FuzzCheck(Fill_WordIndex(list) == 1);

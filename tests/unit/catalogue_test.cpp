@@ -175,7 +175,7 @@ TEST_F(CatalogueTest, TreeLayoutFollowsTheTwoCachesAndTheChildSearch) {
       // names, outline
       {"A>B>x A>C>y A>B>z", "A(B(x) C(y) B(z))"},        // second level: only the last node cached
       {"A>B>x C>B>y A>B>z", "A(B(x)) C(B(y)) A(B(z))"},  // first level: the same
-      {"F>T>C>x F>T>D>y F>T>c>z", "F(T(C(x z) D(y)))"},  // deeper: found among the children
+      {"F>T>c>x F>T>D>y F>T>C>z", "F(T(c(x z) D(y)))"},  // deeper: found among the children
       {"M>y m>x M>L>a m>l>b", "M(y x L(a b))"},          // case ignored, the first text stays
       {"Readme Cat>x", "Readme Cat(x)"},
       {"Cat> Cat>Sub>", "Cat('' Sub(''))"},

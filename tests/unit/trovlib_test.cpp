@@ -34,7 +34,7 @@ TEST(TrovSearch, PatternsCategoriesNamesAndTheIndexBuiltOnce) {
       themes("TROVLIB_ICON_THEMES", dir / "t1:" + dir / "t2");
   const char* docs = "TeX system documentation";
   const std::tuple<const char*, std::string, const char*> rows[] = {
-      // spec, name, found
+      // pattern, name, found
       {"$TEXMF/Docuvane//", "Docuvane.ini", "A/Docuvane/Docuvane.ini"},
       {docs, "only-b.pdf", "B/doc/only-b.pdf"},
       {docs, "dup.pdf", "A/doc/dup.pdf"},              // shallower path first
@@ -47,9 +47,9 @@ TEST(TrovSearch, PatternsCategoriesNamesAndTheIndexBuiltOnce) {
       {"Icon", "x", "t1/24x24/apps/x.xpm"},  // 24, 22, 16, whatever the extension
       {"Icon", "small", "t1/16x16/apps/small.ico"},
   };
-  for (const auto& [spec, name, found] : rows)
-    EXPECT_EQ(OrNull(TrovSearch(spec, name.c_str())), found ? dir / found : "(null)")
-        << spec << " " << name;
+  for (const auto& [pattern, name, found] : rows)
+    EXPECT_EQ(OrNull(TrovSearch(pattern, name.c_str())), found ? dir / found : "(null)")
+        << pattern << " " << name;
   dir.Write("A/doc/new/later.pdf", "x");
   EXPECT_EQ(OrNull(TrovSearch(docs, "later.pdf")), "(null)") << "not walked again";
   ASSERT_EQ(symlink((dir / "A/doc").c_str(), (dir / "A/doc/a/loop").c_str()), 0);
