@@ -1,10 +1,11 @@
-// Small helpers shared by the tests: temporary directories, environment
-// overrides and capture of the library's messages.
+// Helpers shared by the tests: a temporary directory, environment overrides,
+// and capture of the library's messages.
 #pragma once
 
 #include <cstdlib>
 #include <filesystem>
 #include <fstream>
+#include <iterator>
 #include <optional>
 #include <string>
 #include <vector>
@@ -13,72 +14,66 @@
 
 namespace testing_support {
 
-// A fresh directory under the system's temporary directory, removed with
-// everything in it when the object goes.
-class TempDir {
+struct NoCopy {
+  NoCopy() = default;
+  NoCopy(const NoCopy&) = delete;
+};
+
+// A fresh directory, removed with its contents at the end.
+class TempDir : NoCopy {
  public:
   TempDir() {
-    std::string tmpl = (std::filesystem::temp_directory_path() / "docuvane-test-XXXXXX").string();
-    std::vector<char> buf(tmpl.begin(), tmpl.end());
-    buf.push_back('\0');
-    if (mkdtemp(buf.data()) == nullptr) std::abort();
-    path_ = buf.data();
+    std::string name = (std::filesystem::temp_directory_path() / "docuvane-test-XXXXXX").string();
+    if (mkdtemp(name.data()) == nullptr) std::abort();
+    path_ = name;
   }
-  ~TempDir() {
-    std::error_code ec;
-    std::filesystem::remove_all(path_, ec);
-  }
-  TempDir(const TempDir&) = delete;
-  TempDir& operator=(const TempDir&) = delete;
-
+  ~TempDir() { std::filesystem::remove_all(path_, ec_); }
   const std::string& path() const { return path_; }
   std::string operator/(const std::string& rel) const { return path_ + "/" + rel; }
-
-  // Writes a file (creating its directories) and returns its full path.
+  // Writes a file, making its directories; returns its path.
   std::string Write(const std::string& rel, const std::string& content) const {
-    std::filesystem::path p = std::filesystem::path(path_) / rel;
+    const std::filesystem::path p = std::filesystem::path(path_) / rel;
     std::filesystem::create_directories(p.parent_path());
-    std::ofstream out(p, std::ios::binary | std::ios::trunc);
-    out.write(content.data(), static_cast<std::streamsize>(content.size()));
+    std::ofstream(p, std::ios::binary) << content;
     return p.string();
   }
 
  private:
   std::string path_;
+  std::error_code ec_;
 };
 
-// Sets (or, with nullopt, unsets) an environment variable for the lifetime
-// of the object and restores it afterwards.
-class ScopedEnv {
+// Sets (nullopt: unsets) an environment variable while it lives.
+class ScopedEnv : NoCopy {
  public:
   ScopedEnv(const char* name, std::optional<std::string> value) : name_(name) {
-    if (const char* old = std::getenv(name)) old_ = std::string(old);
-    if (value) setenv(name, value->c_str(), 1);
-    else unsetenv(name);
-    TrovResetCaches();
+    if (const char* old = std::getenv(name)) old_ = old;
+    Set(value);
   }
-  ~ScopedEnv() {
-    if (old_) setenv(name_.c_str(), old_->c_str(), 1);
-    else unsetenv(name_.c_str());
-    TrovResetCaches();
-  }
-  ScopedEnv(const ScopedEnv&) = delete;
-  ScopedEnv& operator=(const ScopedEnv&) = delete;
+  ~ScopedEnv() { Set(old_); }
 
  private:
+  void Set(const std::optional<std::string>& value) {
+    value ? setenv(name_.c_str(), value->c_str(), 1) : unsetenv(name_.c_str());
+    TrovResetCaches();
+  }
   std::string name_;
   std::optional<std::string> old_;
 };
 
+inline std::string ReadAll(const std::filesystem::path& path) {
+  std::ifstream in(path, std::ios::binary);
+  return std::string(std::istreambuf_iterator<char>(in), std::istreambuf_iterator<char>());
+}
+
 struct CapturedMessage {
-  std::string prefix;
-  std::string text;
+  std::string prefix, text;
   int level;
   std::string line() const { return prefix + text; }
 };
 
 // Collects every library message while it lives.
-class MessageCapture {
+class MessageCapture : NoCopy {
  public:
   MessageCapture() {
     TrovSetMessageSink([this](const char* prefix, const char* text, int level) {
@@ -86,18 +81,10 @@ class MessageCapture {
     });
   }
   ~MessageCapture() { TrovSetMessageSink({}); }
-  MessageCapture(const MessageCapture&) = delete;
-  MessageCapture& operator=(const MessageCapture&) = delete;
-
   const std::vector<CapturedMessage>& messages() const { return messages_; }
   void clear() { messages_.clear(); }
-  // True when some message's prefix + text contains `needle`.
-  bool Contains(const std::string& needle) const {
-    for (const auto& m : messages_)
-      if (m.line().find(needle) != std::string::npos) return true;
-    return false;
-  }
-  // The level of the first message whose prefix + text contains `needle`, or -1.
+  bool Contains(const std::string& needle) const { return LevelOf(needle) != -1; }
+  // The level of the first message whose line contains `needle`, or -1.
   int LevelOf(const std::string& needle) const {
     for (const auto& m : messages_)
       if (m.line().find(needle) != std::string::npos) return m.level;

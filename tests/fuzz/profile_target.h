@@ -1,10 +1,8 @@
 // Fuzz target for the INI text parser, shared by the libFuzzer driver and the
-// corpus replay.  The first and last bytes (read as part of the text as well)
-// choose the section, the key and the buffer size; each run then asks for a
-// value, the section's key names and the section names.
+// corpus replay.  The first and last bytes choose the section, the key and the
+// buffer size; each run asks for a value, the section's keys and the sections.
 #pragma once
 
-#include <cstddef>
 #include <cstdint>
 #include <cstring>
 #include <vector>
@@ -18,18 +16,15 @@ inline void FuzzProfileLookup(const char* text, size_t length, const char* secti
   if (buffer[size] != '\x5a' || (size == 0 && n != 0)) __builtin_trap();
   if (size == 0) return;
   if (n >= size || buffer[n] != '\0') __builtin_trap();
-  if (key != nullptr && section != nullptr) {
-    if (std::strlen(buffer.data()) != n) __builtin_trap();
-    return;
-  }
-  // A list: walking its names must reach the empty one inside the buffer.
-  size_t at = 0;
-  while (at < size && buffer[at] != '\0') {
+  const bool list = key == nullptr || section == nullptr;
+  if (!list && std::strlen(buffer.data()) != n) __builtin_trap();
+  size_t at = 0;  // a list's names end in an empty one inside the buffer
+  while (list && at < size && buffer[at] != '\0') {
     const void* end = std::memchr(buffer.data() + at, '\0', size - at);
     if (end == nullptr) __builtin_trap();
     at = static_cast<size_t>(static_cast<const char*>(end) - buffer.data()) + 1;
   }
-  if (at >= size) __builtin_trap();
+  if (list && at >= size) __builtin_trap();
 }
 
 inline int FuzzProfileInput(const uint8_t* data, size_t size) {

@@ -1,5 +1,5 @@
-// Shared pieces of the GUI tests: a TeX tree in a temporary directory, an
-// isolated environment, the real frame, and bounded waits for the event loop.
+// The GUI tests' fixture: a TeX tree, an isolated environment, the real
+// frame, and bounded waits for the event loop.
 #pragma once
 
 #include <gtest/gtest.h>
@@ -8,9 +8,10 @@
 
 #include <chrono>
 #include <functional>
-#include <memory>
+#include <list>
 #include <thread>
 
+#include "base/settings.h"
 #include "catalogue/keywords.h"
 #include "catalogue/pool.h"
 #include "platform/profile.h"
@@ -30,29 +31,27 @@ using testing_support::ScopedEnv;
 using testing_support::TempDir;
 using Args = std::vector<std::string>;
 
-// Runs the event loop until `done` holds or `ms` milliseconds have passed.
+// Runs the event loop until `done` holds or `ms` have passed.
 inline bool WaitFor(const std::function<bool()>& done, int ms = 5000) {
-  const auto end = std::chrono::steady_clock::now() + std::chrono::milliseconds(ms);
-  for (; !done(); std::this_thread::sleep_for(std::chrono::milliseconds(5))) {
-    if (std::chrono::steady_clock::now() > end) return false;
-    wxYield();
-  }
-  return true;
+  for (int i = 0; i < ms / 5;
+       ++i, wxYield(), std::this_thread::sleep_for(std::chrono::milliseconds(5)))
+    if (done()) return true;
+  return false;
 }
 
 inline void Flush() {
   for (int i = 0; i < 5; ++i) wxYield();
 }
 
-// The test tree.  INI documents Manuals>LaTeX>Guide (keyword \section with
-// two anchors), Manuals>LaTeX>Reference, Manuals>Fonts>Catalogue,
-// Help>Docuvane (keyword .LMR.Help); word index labels latex/base/sample.pdf,
-// fonts/fontguide.pdf, math/amsldoc.pdf.  PDFs open through a template.
+// Documents Manuals>LaTeX>Guide (keyword \section, two anchors),
+// Manuals>LaTeX>Reference, Manuals>Fonts>Catalogue, Help>Docuvane; index
+// labels latex/base/sample.pdf, fonts/fontguide.pdf, math/amsldoc.pdf.  PDFs
+// open through a template; the viewer and xdg-open record their arguments.
 class WindowTest : public ::testing::Test {
  protected:
   TempDir root;
   const std::string texmf = root / "texmf", home = root / "home", records = root / "records";
-  std::vector<std::unique_ptr<ScopedEnv>> env;
+  std::list<ScopedEnv> env;
   MyFrame* frame = nullptr;
 
   void SetUp() override {
@@ -64,76 +63,50 @@ class WindowTest : public ::testing::Test {
         {"XDG_DATA_DIRS", root / "data:/usr/local/share:/usr/share"},
         {"PATH", root / "bin:/usr/bin:/bin"}, {"TROVLIB_ICON_THEMES", ""},
         {"DOCSERVER", "http://127.0.0.1:9/docs"}};
-    for (const auto& [name, value] : vars) env.push_back(std::make_unique<ScopedEnv>(name, value));
+    for (const auto& [name, value] : vars) env.emplace_back(name, value);
     for (const char* doc : {"latex/guide/guide.pdf", "latex/reference.pdf", "fonts/fontcat.pdf",
                             "docuvane/docuvane-help.pdf", "latex/base/sample.pdf",
                             "fonts/fontguide.pdf", "math/amsldoc.pdf"})
       root.Write(std::string("texmf/doc/") + doc, "%PDF-1.4\n%%EOF\n");
-    root.Write("texmf/Docuvane/Docuvane.ini",
-               "[Setup]\nTrace=0\n[DOC]\n"
+    root.Write("texmf/Docuvane/Docuvane.ini", "[Setup]\nTrace=0\n[DOC]\n"
                "Manuals>LaTeX>Guide=guide.pdf\nManuals>LaTeX>Reference=reference.pdf\n"
                "Manuals>Fonts>Catalogue=fontcat.pdf\nHelp>Docuvane=docuvane-help.pdf\n"
                "[Extensions]\npdf=<docuvane-test-viewer> ^.pdf #\n");
     root.Write("texmf/doc/latex/guide/guide.ddf", "[Keywords]\n\\section=sec:section#sec:headings");
     root.Write("texmf/doc/docuvane/docuvane-help.ddf", "[Keywords]\n.LMR.Help=help-start\n");
-    const std::string listing = root.Write("listing.txt",  // the '@' word is never listed
+    const std::string listing = root.Write("listing.txt",
         "\\section\tlatex/base/sample.pdf\t12 15\n" "\\section\tfonts/fontguide.pdf\t3\n"
         "\\sectionmark\tlatex/base/sample.pdf\t20\n" "{align}\tmath/amsldoc.pdf\t7\n"
         "\\alpha\tmath/amsldoc.pdf\t2\n" "\\@ifnextchar\tlatex/base/sample.pdf\t4\n"
         "\\begin\tlatex/base/sample.pdf\t1\n" "tabular\tlatex/base/sample.pdf\t9\n");
     std::filesystem::create_directories(texmf + "/Update");
-    const std::string mkindex =
-        DOCUVANE_MKINDEX " '" + listing + "' '" + texmf + "/Update/command.Index'";
-    ASSERT_EQ(std::system(mkindex.c_str()), 0);
-    // The viewer and the stand-in xdg-open record their names and arguments, a file per start.
+    ASSERT_EQ(std::system((DOCUVANE_MKINDEX " '" + listing + "' '" + texmf +
+                           "/Update/command.Index'").c_str()), 0);
     for (const std::string name : {"docuvane-test-viewer", "xdg-open"})
       std::filesystem::permissions(root.Write("bin/" + name,
           "#!/bin/sh\nf='" + root.path() + "/" + name + "-'$$\nprintf '%s\\n' " + name +
           " \"$@\" > \"$f\"\nmv \"$f\" '" + records + "'\n"), std::filesystem::perms::owner_all);
     // clang-format on
-    std::filesystem::create_directories(home);
-    std::filesystem::create_directories(records);
-    ResetProgramState();
-    ReopenConfig();
+    std::filesystem::create_directories(home), std::filesystem::create_directories(records);
+    ResetProgramState(), ReopenConfig();
   }
-
-  void TearDown() override {
-    CloseFrame();
-    ReopenConfig();
-    ResetProgramState();
-  }
-
-  // Empties the process-wide tables an earlier frame filled.
+  void TearDown() override { CloseFrame(), ReopenConfig(), ResetProgramState(); }
+  // Empties the process-wide tables an earlier frame filled; the configuration is read afresh.
   static void ResetProgramState() {
     Clear_Tables();
     ProfileCacheClear();
   }
 
-  // The next use reads the configuration file of $HOME afresh.
   static void ReopenConfig() { delete wxConfigBase::Set(nullptr); }
-
-  // Builds the frame as start-up does and shows it.
-  void OpenFrame() {
+  void OpenFrame() {  // as start-up does
     Docuvane_Init(OpenInstalledWordIndex);
     frame = new MyFrame("Lomari Docuvane");
     frame->Show();
     WaitFor([this] { return frame->IsShownOnScreen(); });
     Flush();
   }
-
-  void CloseFrame() {
-    delete frame;
-    frame = nullptr;
-    Flush();
-  }
-
-  void ReopenFrame() {
-    CloseFrame();
-    ReopenConfig();
-    ResetProgramState();
-    OpenFrame();
-  }
-
+  void CloseFrame() { delete frame, frame = nullptr, Flush(); }
+  void ReopenFrame() { TearDown(), OpenFrame(); }
   Docuvane* panel() const { return frame->m_helpPanel; }
 };
 

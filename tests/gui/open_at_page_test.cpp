@@ -23,7 +23,7 @@ TEST_F(WindowTest, DoubleClickOnALocationOpensTheViewerAtItsPlace) {
       root.Write("bin/evince", "#!/bin/sh\nprintf '%s\\0' \"$@\" >'" + record + ".part'\nmv '" +
                                    record + ".part' '" + record + "'\n"),
       std::filesystem::perms::owner_all);
-  env.push_back(std::make_unique<ScopedEnv>("DOCUVANE_VIEWER", "evince"));
+  env.emplace_back("DOCUVANE_VIEWER", "evince");
   OpenFrame();
   frame->Raise();
   panel()->m_search->SetValue("\\section");

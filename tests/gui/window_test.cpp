@@ -1,12 +1,17 @@
-// The main window on a test tree: catalogue tree, word list, status line,
-// geometry and sash kept in the configuration store, icon buttons.
+// The main window on the test tree, driven as a user drives it: catalogue tree,
+// word list and status line; typing fills the Locations list, a location is shown
+// in the tree and opened, so is a tree item; the buttons reach the window that
+// handles them; programs start with exactly their arguments.
 #include <gtest/gtest.h>
-#include <wx/bmpbuttn.h>
-#include <wx/image.h>
+#include <wx/button.h>
 #include <wx/listbox.h>
+#include <wx/srchctrl.h>
 #include <wx/statusbr.h>
 #include <wx/treectrl.h>
+#include <wx/uiaction.h>
 
+#include "access/desktop_services_gui.h"
+#include "catalogue/tree.h"
 #include "gui_support.h"
 #include "window/ids.h"
 #include "window/qlistbox.h"
@@ -14,23 +19,86 @@
 namespace gui_testing {
 namespace {
 
-// The tree as indented text, two blanks per level.
-std::string Outline(wxTreeCtrl* tree, const wxTreeItemId& parent, int depth = 0) {
-  std::string out;
-  wxTreeItemIdValue cookie;
-  for (wxTreeItemId child = tree->GetFirstChild(parent, cookie); child.IsOk();
-       child = tree->GetNextSibling(child))
-    out += std::string(2 * depth, ' ') + tree->GetItemText(child).utf8_string() + "\n" +
-           Outline(tree, child, depth + 1);
-  return out;
-}
+class LookupTest : public WindowTest {
+ protected:
+  wxUIActionSimulator sim;
+  Docuvane* p = nullptr;
 
-TEST_F(WindowTest, ShowsCatalogueTreeWordListAndCounts) {
-  MessageCapture messages;
-  OpenFrame();
-  Docuvane* p = panel();
+  void SetUp() override {
+    WindowTest::SetUp();
+    if (HasFatalFailure()) return;
+    OpenFrame();
+    frame->Raise();
+    p = panel();
+  }
+  // Clicks a point of `window` (client coordinates; by default its middle).
+  void Click(wxWindow* window, wxPoint at = wxDefaultPosition, bool twice = false) {
+    if (at == wxDefaultPosition)
+      at = wxPoint(window->GetClientSize().x / 2, window->GetClientSize().y / 2);
+    sim.MouseMove(window->ClientToScreen(at));
+    Flush();
+    twice ? sim.MouseDblClick() : sim.MouseClick();
+    Flush();
+  }
+  void ClickLocation(int row, bool twice = false) {
+    for (int y = 1; y < p->m_targetList->GetClientSize().y; ++y)
+      if (p->m_targetList->HitTest(wxPoint(20, y)) == row)
+        return Click(p->m_targetList, wxPoint(20, y + 3), twice);
+    ADD_FAILURE() << "row " << row << " is not visible";
+  }
+  void DoubleClickItem(const std::string& text) {
+    p->m_tree->EnsureVisible(Item(text));
+    Flush();
+    wxRect rect;
+    ASSERT_TRUE(p->m_tree->GetBoundingRect(Item(text), rect, true)) << text;
+    Click(p->m_tree, rect.GetPosition() + rect.GetSize() / 2, true);
+  }
+  Args Locations() {
+    Args items;
+    for (const wxString& s : p->m_targetList->GetStrings()) items.push_back(s.utf8_string());
+    return items;
+  }
+  // The tree's items in outline order, with the text indented two blanks a level.
+  std::vector<std::pair<std::string, wxTreeItemId>> Items(wxTreeItemId parent = {}, int depth = 0) {
+    std::vector<std::pair<std::string, wxTreeItemId>> items;
+    wxTreeItemIdValue cookie;
+    for (wxTreeItemId c =
+             p->m_tree->GetFirstChild(parent.IsOk() ? parent : p->m_tree->GetRootItem(), cookie);
+         c.IsOk(); c = p->m_tree->GetNextSibling(c)) {
+      items.emplace_back(std::string(2 * depth, ' ') + p->m_tree->GetItemText(c).utf8_string(), c);
+      for (auto& below : Items(c, depth + 1)) items.push_back(below);
+    }
+    return items;
+  }
+  wxTreeItemId Item(const std::string& text) {
+    for (const auto& [indented, id] : Items())
+      if (indented.substr(indented.find_first_not_of(' ')) == text) return id;
+    return {};
+  }
+  // Waits for a recorded start and gives its program name and arguments.
+  Args Run() {
+    WaitFor([&] { return !std::filesystem::is_empty(records); });
+    Flush();
+    Args run;
+    for (const auto& entry : std::filesystem::directory_iterator(records)) {
+      std::ifstream in(entry.path());
+      for (std::string line; std::getline(in, line);) run.push_back(line);
+      std::filesystem::remove(entry.path());
+    }
+    return run;
+  }
+  // What a start of the viewer on `doc` (under doc/) with these further arguments records.
+  Args Viewer(const std::string& doc, Args more = {}) {
+    more.insert(more.begin(), {"docuvane-test-viewer", texmf + "/doc/" + doc});
+    return more;
+  }
+};
+
+TEST_F(LookupTest, ShowsCatalogueTreeWordListAndCounts) {
   // Categories in table order; labels follow under nodes named after their directories.
-  EXPECT_EQ(Outline(p->m_tree, p->m_tree->GetRootItem()),
+  std::string outline;
+  for (const auto& [indented, id] : Items()) outline += indented + "\n";
+  EXPECT_EQ(outline,
             "Manuals\n  LaTeX\n    Guide\n    Reference\n  Fonts\n    Catalogue\nHelp\n  Docuvane\n"
             "latex\n  base\n    sample.pdf\nfonts\n  fontguide.pdf\nmath\n  amsldoc.pdf\n");
   // Sorted ignoring case and one leading backslash or brace; no '@' word.
@@ -39,13 +107,8 @@ TEST_F(WindowTest, ShowsCatalogueTreeWordListAndCounts) {
     rows.push_back(p->m_wordList->GetString(i).utf8_string());
   EXPECT_EQ(rows, (Args{"", "{align}", "\\alpha", "\\begin", "\\section", "\\sectionmark",
                         "tabular", ""}));
-  EXPECT_TRUE(messages.Contains("WARNING: Skipped index word: \\@ifnextchar"));
   EXPECT_EQ(frame->GetStatusBar()->GetStatusText(0),
             "There are 7 documents including 4 TeX commands and 1 LaTeX environments.");
-  EXPECT_EQ(frame->GetIcons().GetIconCount(), 5u) << "the compiled-in icon, 16 to 256 pixels";
-  EXPECT_FALSE(p->m_gotoButton->IsEnabled());
-  EXPECT_EQ(p->m_targetList->GetCount(), 0u);
-
   std::filesystem::remove(texmf + "/Update/command.Index");
   ReopenFrame();
   EXPECT_EQ(panel()->m_wordList->GetItemCount(), 0u) << "without a word index";
@@ -53,119 +116,92 @@ TEST_F(WindowTest, ShowsCatalogueTreeWordListAndCounts) {
             "There are 4 documents including 0 TeX commands and 0 LaTeX environments.");
 }
 
-TEST_F(WindowTest, GeometryIsRestoredClampedToTheScreenAndSaved) {
-  ASSERT_EQ(VirtualScreenSize(), wxSize(1600, 1200))
-      << "the tests expect run-with-display's screen";
-  const struct {
-    const char* what;
-    std::optional<wxRect> stored;  // DIPs
-    wxRect expected;
-  } rows[] = {
-      // clang-format off
-      {"first start: 50, 50, 800 x 600", std::nullopt, {50, 50, 800, 600}},
-      {"smaller than the default: the default", wxRect(100, 120, 600, 500), {100, 120, 800, 600}},
-      {"fits: kept", wxRect(200, 100, 1000, 700), {200, 100, 1000, 700}},
-      {"too wide: as wide as the screen, at 0", wxRect(300, 40, 3000, 700), {0, 40, 1600, 700}},
-      {"too tall: as tall as the screen, at 0", wxRect(10, 400, 900, 5000), {10, 0, 900, 1200}},
-      {"left of and above the screen: moved to 0", wxRect(-200, -30, 900, 650), {0, 0, 900, 650}},
-      {"past right and bottom: moved back", wxRect(1500, 1100, 800, 600), {800, 600, 800, 600}},
-      // clang-format on
-  };
-  const char* const keys[] = {"/MainWindow/x", "/MainWindow/y", "/MainWindow/w", "/MainWindow/h",
-                              "/MainWindow/Max"};
-  auto parts = [](const wxRect& r) { return std::vector<long>{r.x, r.y, r.width, r.height, 0}; };
-  for (const auto& row : rows) {
-    SCOPED_TRACE(row.what);
-    for (int i = 0; row.stored && i < 4; ++i)
-      wxConfigBase::Get()->Write(keys[i], parts(*row.stored)[i]);
-    ResetProgramState();
-    OpenFrame();
-    EXPECT_EQ(frame->GetRect(), wxRect(frame->FromDIP(row.expected.GetPosition()),
-                                       frame->FromDIP(row.expected.GetSize())));
-    CloseFrame();
-    ReopenConfig();  // what closing wrote reached the file; the next row overwrites it
-    std::vector<long> saved;
-    for (const char* key : keys) saved.push_back(wxConfigBase::Get()->ReadLong(key, -1));
-    EXPECT_EQ(saved, parts(row.expected));
-  }
+TEST_F(LookupTest, TypingSelectsTheWordAndFillsLocations) {
+  Click(p->m_search);
+  ASSERT_TRUE(sim.Text("\\sec"));
+  ASSERT_TRUE(WaitFor([&] { return p->m_targetList->GetCount() == 4; }));
+  EXPECT_EQ(p->m_wordList->GetString(p->m_wordList->GetSelection()), "\\section");
+  // Keyword targets first, newest first, then the index pages.
+  const std::string guide = texmf + "/doc/latex/guide/guide.pdf";
+  const Args section{guide + "#sec:headings", guide + "#sec:section",
+                     "latex/base/sample.pdf#page=12 15 ", "fonts/fontguide.pdf#page=3 "};
+  EXPECT_EQ(Locations(), section);
+  EXPECT_FALSE(p->m_gotoButton->IsEnabled()) << "row 0 is selected by the program, not the user";
 }
 
-// Minimized and maximized need a window manager, which the test display lacks.
-TEST_F(WindowTest, ClosingStateDecidesWhatIsWritten) {
-  const struct {
-    const char* what;
-    bool iconized, maximized;
-    std::vector<long> stored;  // x, w and Max afterwards
-  } rows[] = {
-      {"normal: the whole geometry and Max = 0", false, false, {70, 900, 0}},
-      {"maximized: only Max = 1", false, true, {11, 811, 1}},
-      {"minimized: nothing", true, false, {11, 811, 5}},
-      {"minimized and maximized: nothing", true, true, {11, 811, 5}},
+TEST_F(LookupTest, ALocationIsBoldedInTheTreeAndOpensThroughTheTemplate) {
+  Show_Topic(p, "\\section", 0);
+  Flush();
+  auto select = [&](int row, const std::string& bold, const std::string& notBold) {
+    ClickLocation(row);
+    ASSERT_TRUE(WaitFor([&] { return p->m_targetList->GetSelection() == row; }));
+    EXPECT_TRUE(p->m_gotoButton->IsEnabled());
+    EXPECT_TRUE(p->m_tree->IsBold(Item(bold)));
+    EXPECT_FALSE(p->m_tree->IsBold(Item(notBold)));
+    EXPECT_EQ(p->m_tree->GetSelection(), Item(bold));
   };
-  const char* const keys[] = {"/MainWindow/x", "/MainWindow/w", "/MainWindow/Max"};
-  const long before[] = {11, 811, 5};
-  wxConfigBase* config = wxConfigBase::Get();
-  for (const auto& row : rows) {
-    SCOPED_TRACE(row.what);
-    for (int i = 0; i < 3; ++i) config->Write(keys[i], before[i]);
-    WriteFrameGeometry(config, row.iconized, row.maximized, wxPoint(70, 80), wxSize(900, 700));
-    std::vector<long> stored;
-    for (const char* key : keys) stored.push_back(config->ReadLong(key, -1));
-    EXPECT_EQ(stored, row.stored);
-  }
+  select(3, "fontguide.pdf", "Guide");  // an index location: its label's node
+  Click(p->m_gotoButton);
+  EXPECT_EQ(Run(), Viewer("fonts/fontguide.pdf", {"page=3 "}));
+  select(1, "Guide", "fontguide.pdf");  // a keyword location: its document's node
+  ClickLocation(1, true);
+  EXPECT_EQ(Run(), Viewer("latex/guide/guide.pdf", {"sec:section"}));
+
+  p->m_search->SetValue("\\alpha");  // a new word takes the bold away
+  Flush();
+  EXPECT_FALSE((HighlightedItem != nullptr) || p->m_tree->IsBold(Item("Guide")));
+  EXPECT_FALSE(p->m_gotoButton->IsEnabled());
+  HighlightDocument(p, "other.pdf#page=1");
+  EXPECT_FALSE((HighlightedItem != nullptr)) << "a document the table does not know";
+  HighlightDocument(p, "LATEX/Base/Sample.PDF");  // no '#': the whole text, case ignored
+  ASSERT_EQ(HighlightedItem, Item("sample.pdf").GetID());
+  EXPECT_TRUE(p->m_tree->IsBold(Item("sample.pdf")));
+  Fill_Tree(p);  // deletes the bold item: the next lookup must not touch it
+  EXPECT_FALSE((HighlightedItem != nullptr));
+  Show_Topic(p, "\\section", 0);
+  EXPECT_EQ(p->m_targetList->GetCount(), 4u);
 }
 
-TEST_F(WindowTest, SashPositionIsSavedAndRestoredInDips) {
-  OpenFrame();
-  EXPECT_EQ(panel()->GetSashPosition(), panel()->FromDIP(300)) << "first start";
-  panel()->SetSashPosition(panel()->FromDIP(420));
-  ReopenFrame();
-  EXPECT_EQ(wxConfigBase::Get()->ReadLong("/MainWindow/Splitter", -1), 420);
-  EXPECT_EQ(panel()->GetSashPosition(), panel()->FromDIP(420));
+TEST_F(LookupTest, TreeItemsAndButtonsOpenWhatTheyShow) {
+  MessageCapture messages;
+  DoubleClickItem("Reference");
+  EXPECT_EQ(Run(), Viewer("latex/reference.pdf"));
+  DoubleClickItem("Manuals");  // a category opens nothing
+  ASSERT_TRUE(WaitFor([&] { return messages.Contains("Not found clicked document"); }));
+  EXPECT_TRUE(std::filesystem::is_empty(records));
+  p->m_tree->SelectItem(Item("Catalogue"));
+  wxCommandEvent open(wxEVT_BUTTON, ID_OPEN_DOC);
+  p->GetEventHandler()->ProcessEvent(open);
+  EXPECT_EQ(Run(), Viewer("fonts/fontcat.pdf"));
+
+  Click(wxWindow::FindWindowById(wxID_HELP, frame));
+  EXPECT_EQ(Run(), Viewer("docuvane/docuvane-help.pdf", {"help-start"}));
+  EXPECT_TRUE(messages.Contains("INFO: MyFrame::OnHelp")) << "the frame handles the button";
 }
 
-TEST_F(WindowTest, IconFilesMakeSquarePictureButtons) {
-  const struct {
-    int id;
-    const char *label, *file;  // the icon file of the second start
-    bool picture, greyClear;   // a picture in the file; its light grey masked out
-  } buttons[] = {
-      {wxID_HELP, "&Help", "help-contents.png", true, false},
-      {ID_INTERNET, "&Internet", "internet-web-browser.bmp", true, true},
-      {wxID_ABOUT, "&About", "help-about.png", false, false},
-  };
-  wxImage image(16, 16);  // light grey with a red square in the middle
-  image.SetRGB(wxRect(0, 0, 16, 16), 192, 192, 192);
-  image.SetRGB(wxRect(4, 4, 8, 8), 200, 0, 0);
-  for (bool installed : {false, true}) {
-    SCOPED_TRACE(installed ? "with icon files" : "without icon files");
-    for (const auto& b : buttons) {
-      if (!installed) continue;
-      const std::string path =
-          root.Write("texmf/Docuvane/icons/" + std::string(b.file), "not a picture");
-      if (b.picture) { ASSERT_TRUE(image.SaveFile(path)); }
-    }
-    ReopenFrame();
-    const int h = panel()->m_gotoButton->GetSize().y;
-    for (const auto& b : buttons) {
-      SCOPED_TRACE(b.file);
-      auto* button = wxDynamicCast(wxWindow::FindWindowById(b.id, frame), wxButton);
-      ASSERT_NE(button, nullptr);
-      EXPECT_FALSE(button->GetToolTipText().empty());
-      auto* picture = wxDynamicCast(button, wxBitmapButton);
-      ASSERT_EQ(picture != nullptr, installed) << "a picture button exactly when the file exists";
-      if (!picture) {
-        EXPECT_EQ(button->GetLabel(), b.label);
-        continue;
-      }
-      EXPECT_EQ(button->GetSize(), wxSize(h, h));
-      const wxBitmap bitmap = picture->GetBitmapLabel();
-      ASSERT_EQ(bitmap.IsOk(), b.picture);
-      if (!b.picture) continue;
-      EXPECT_EQ(bitmap.ConvertToImage().IsTransparent(0, 0), b.greyClear) << "only BMP lose grey";
-      EXPECT_FALSE(bitmap.ConvertToImage().IsTransparent(8, 8));
-    }
-  }
+TEST(DesktopServices, ExecuteHandsOverEveryArgumentUnchanged) {
+  TempDir dir;
+  const std::string record = dir / "record", touch = "touch " + dir / "SENTINEL";
+  const std::string recorder =
+      dir.Write("recorder", "#!/bin/sh\nfor a in \"$@\"; do printf '%s\\0' \"$a\"; done > '" +
+                                record + ".tmp'\nmv '" + record + ".tmp' '" + record + "'\n");
+  std::filesystem::permissions(recorder, std::filesystem::perms::owner_all);
+  // clang-format off
+  const Args hostile = {"a\" --evil-opt=1 \"b", "$(" + touch + ")", "`" + touch + "`", ";" + touch,
+                        "back\\slash", "-rf", "new\nline", "Gr\u00fc\u00dfe", "", "  blanks  "};
+  // clang-format on
+  DesktopAccessServices services(nullptr);
+  Args argv{recorder};
+  argv.insert(argv.end(), hostile.begin(), hostile.end());
+  EXPECT_GT(services.Execute(argv), 0);
+  ASSERT_TRUE(WaitFor([&] { return std::filesystem::exists(record); }));
+  std::ifstream in(record, std::ios::binary);
+  Args received;
+  for (std::string arg; std::getline(in, arg, '\0');) received.push_back(arg);
+  EXPECT_EQ(received, hostile);
+  EXPECT_FALSE(std::filesystem::exists(dir / "SENTINEL"));
+  EXPECT_EQ(services.Execute({""}), 0) << "a template whose program was not found";
+  EXPECT_EQ(services.Execute({dir / "missing-viewer"}), 0);
 }
 
 }  // namespace

