@@ -23,10 +23,22 @@
 
 namespace {
 
+// The 8-bit text of the selected row, exactly as it was listed: a display
+// string read back could name another file (a byte the locale cannot read
+// is shown as a Latin-1 character, and converts back as something else).
 std::string SelectedLocation(Docuvane* panel, int* row) {
   *row = panel->m_targetList ? panel->m_targetList->GetSelection() : wxNOT_FOUND;
   if (*row == wxNOT_FOUND) return std::string();
+  if (static_cast<std::size_t>(*row) < panel->m_locationTexts.size())
+    return panel->m_locationTexts[static_cast<std::size_t>(*row)];
   return FromWx(panel->m_targetList->GetString(static_cast<unsigned>(*row)));
+}
+
+void AppendLocations(Docuvane* panel, const std::vector<std::string>& items) {
+  wxArrayString texts;
+  for (const std::string& item : items) texts.Add(ToWx(item));
+  panel->m_targetList->Append(texts);
+  panel->m_locationTexts.insert(panel->m_locationTexts.end(), items.begin(), items.end());
 }
 
 }  // namespace
@@ -37,6 +49,7 @@ void Show_Topic(Docuvane* panel, const char* word, int openIfSingle) {
   if (!panel) return;
   wxListBox* locations = panel->m_targetList;
   if (locations) locations->Clear();
+  panel->m_locationTexts.clear();
   if (panel->m_gotoButton) panel->m_gotoButton->Disable();
   if (HighlightedItem != nullptr) {
     if (panel->m_tree) panel->m_tree->SetItemBold(wxTreeItemId(HighlightedItem), false);
@@ -45,9 +58,7 @@ void Show_Topic(Docuvane* panel, const char* word, int openIfSingle) {
 
   const KeywordTargets targets = CollectKeywordTargets(word);
   if (locations && !targets.items.empty()) {
-    wxArrayString texts;
-    for (const std::string& item : targets.items) texts.Add(ToWx(item));
-    locations->Append(texts);
+    AppendLocations(panel, targets.items);
     // Selecting in code sends no event: "&Go To" waits for the user's choice.
     locations->SetSelection(0);
   }
@@ -59,11 +70,7 @@ void Show_Topic(Docuvane* panel, const char* word, int openIfSingle) {
     if (offset != 0) {
       std::vector<std::string> items;
       LoadWordReferences(offset, word, items);
-      if (locations && !items.empty()) {
-        wxArrayString texts;
-        for (const std::string& item : items) texts.Add(ToWx(item));
-        locations->Append(texts);
-      }
+      if (locations && !items.empty()) AppendLocations(panel, items);
     }
   }
 }

@@ -7,6 +7,9 @@
 #include <wx/splitter.h>
 #include <wx/treebase.h>
 
+#include <string>
+#include <vector>
+
 class wxButton;
 class wxListBox;
 class wxSearchCtrl;
@@ -26,6 +29,8 @@ class Docuvane : public wxSplitterWindow {
   QListBox* m_wordList = nullptr;
   wxListBox* m_targetList = nullptr;
   wxButton* m_gotoButton = nullptr;
+  // The Locations list's rows as 8-bit texts, exactly as listed.
+  std::vector<std::string> m_locationTexts;
   wxSplitterWindow* m_splitter = nullptr;
 
   // A picture button from the icon theme when `iconName` is installed, else

@@ -3,6 +3,9 @@
 #include <wx/srchctrl.h>
 #include <wx/treectrl.h>
 
+#include <string>
+#include <unordered_map>
+
 #include "access/opendoc_gui.h"
 #include "text/wxtext_gui.h"
 #include "catalogue/tree.h"
@@ -43,11 +46,14 @@ class TreeCtrlView : public DocumentTreeView {
   explicit TreeCtrlView(wxTreeCtrl* tree) : tree_(tree) {}
   void Freeze() override { tree_->Freeze(); }
   void Thaw() override { tree_->Thaw(); }
-  void DeleteAllItems() override { tree_->DeleteAllItems(); }
+  void DeleteAllItems() override {
+    tree_->DeleteAllItems();
+    Texts().clear();
+  }
   Item GetRootItem() override { return tree_->GetRootItem().GetID(); }
-  Item AddRoot(const std::string& text) override { return tree_->AddRoot(ToWx(text)).GetID(); }
+  Item AddRoot(const std::string& text) override { return Keep(tree_->AddRoot(ToWx(text)), text); }
   Item AppendItem(Item parent, const std::string& text) override {
-    return tree_->AppendItem(wxTreeItemId(parent), ToWx(text)).GetID();
+    return Keep(tree_->AppendItem(wxTreeItemId(parent), ToWx(text)), text);
   }
   Item GetFirstChild(Item parent) override {
     wxTreeItemIdValue cookie;
@@ -56,9 +62,23 @@ class TreeCtrlView : public DocumentTreeView {
   Item GetNextChild(Item, Item previous) override {
     return tree_->GetNextSibling(wxTreeItemId(previous)).GetID();
   }
-  std::string GetItemText(Item item) override { return FromWx(tree_->GetItemText(wxTreeItemId(item))); }
+  // The 8-bit text an item was made with, exactly: its display string read
+  // back may differ when the locale cannot read every byte.
+  std::string GetItemText(Item item) override {
+    const auto kept = Texts().find(item);
+    if (kept != Texts().end()) return kept->second;
+    return FromWx(tree_->GetItemText(wxTreeItemId(item)));
+  }
 
  private:
+  static std::unordered_map<Item, std::string>& Texts() {
+    static std::unordered_map<Item, std::string> texts;
+    return texts;
+  }
+  static Item Keep(const wxTreeItemId& id, const std::string& text) {
+    if (id.IsOk()) Texts()[id.GetID()] = text;
+    return id.GetID();
+  }
   wxTreeCtrl* tree_;
 };
 

@@ -162,6 +162,26 @@ TEST_F(LookupTest, ALocationIsBoldedInTheTreeAndOpensThroughTheTemplate) {
   EXPECT_EQ(p->m_targetList->GetCount(), 4u);
 }
 
+// A label the locale cannot read is shown byte for byte, and the row reads
+// back as the very bytes it was made of: bolded and opened as that file.
+TEST_F(LookupTest, ALabelTheLocaleCannotReadStaysItsOwnBytes) {
+  root.Write("texmf/doc/latex/caf\xe9.pdf", "%PDF-1.4\n%%EOF\n");
+  const std::string listing =
+      root.Write("accent.txt", "\\accent\tlatex/base/sample.pdf\t1\n\\accent\tlatex/caf\xe9.pdf\t3\n");
+  ASSERT_EQ(std::system((DOCUVANE_MKINDEX " '" + listing + "' '" + texmf + "/Update/command.Index'")
+                            .c_str()),
+            0);
+  ReopenFrame();
+  p = panel();
+  Show_Topic(p, "\\accent", 0);
+  Flush();
+  ClickLocation(1);
+  ASSERT_TRUE(WaitFor([&] { return p->m_targetList->GetSelection() == 1; }));
+  EXPECT_TRUE(p->m_tree->IsBold(Item("caf\u00e9.pdf")));
+  Click(p->m_gotoButton);
+  EXPECT_EQ(Run(), Viewer("latex/caf\xe9.pdf", {"page=3 "}));
+}
+
 TEST_F(LookupTest, TreeItemsAndButtonsOpenWhatTheyShow) {
   MessageCapture messages;
   DoubleClickItem("Reference");
