@@ -6,6 +6,7 @@
 #include <wx/button.h>
 #include <wx/listbox.h>
 #include <wx/srchctrl.h>
+#include <wx/statbmp.h>
 #include <wx/statusbr.h>
 #include <wx/treectrl.h>
 #include <wx/uiaction.h>
@@ -13,6 +14,7 @@
 #include "access/desktop_services_gui.h"
 #include "catalogue/tree.h"
 #include "gui_support.h"
+#include "window/about.h"
 #include "window/ids.h"
 #include "window/qlistbox.h"
 
@@ -197,6 +199,17 @@ TEST_F(LookupTest, TreeItemsAndButtonsOpenWhatTheyShow) {
   Click(wxWindow::FindWindowById(wxID_HELP, frame));
   EXPECT_EQ(Run(), Viewer("docuvane/docuvane-help.pdf", {"help-start"}));
   EXPECT_TRUE(messages.Contains("INFO: MyFrame::OnHelp")) << "the frame handles the button";
+}
+
+// A logo found under an upper-case extension but unreadable still takes its
+// place in the About dialog: the picture slot stays, empty.
+TEST_F(LookupTest, AnUnreadableLogoKeepsItsSlot) {
+  root.Write("texmf/Docuvane/Docuvane.BMP", "not a picture");
+  TrovResetCaches();
+  AboutDlg about(frame);
+  int pictures = 0;
+  for (wxWindow* child : about.GetChildren()) pictures += wxDynamicCast(child, wxStaticBitmap) != nullptr;
+  EXPECT_EQ(pictures, 1);
 }
 
 TEST(DesktopServices, ExecuteHandsOverEveryArgumentUnchanged) {

@@ -26,7 +26,7 @@ TEST(TrovSearch, PatternsCategoriesNamesAndTheIndexBuiltOnce) {
       "A/doc/latex/base/guide.pdf A/doc/context/guide.pdf A/doc/a/b/dup.pdf B/doc/only-b.pdf "
       "A/doc/xlatex/base/only.pdf A/Docuvane/logo.png B/Docuvane/logo.xpm bin1/data "
       "t1/16x16/apps/x.png t1/24x24/apps/x.xpm t1/22x22/apps/x.png t1/16x16/apps/small.ico "
-      "t1/32x32/apps/small.png");
+      "t1/32x32/apps/small.png A/Docuvane/Upper.BMP t1/24x24/apps/caps.PnG");
   for (std::string rel; files >> rel;) dir.Write(rel, "x");
   for (const char* rel : {"bin1/tool", "bin2/tool", "bin2/only"})
     chmod(dir.Write(rel, "").c_str(), 0755);
@@ -46,6 +46,11 @@ TEST(TrovSearch, PatternsCategoriesNamesAndTheIndexBuiltOnce) {
       {"Program", "data", nullptr},          // not executable
       {"Icon", "x", "t1/24x24/apps/x.xpm"},  // 24, 22, 16, whatever the extension
       {"Icon", "small", "t1/16x16/apps/small.ico"},
+      // Icon and logo names match their image extension in any case.
+      {"Logo", "Upper", "A/Docuvane/Upper.BMP"},
+      {"Logo", "Upper.bmp", "A/Docuvane/Upper.BMP"},
+      {"Icon", "caps", "t1/24x24/apps/caps.PnG"},
+      {"$TEXMF/Docuvane//", "Upper.bmp", nullptr},  // patterns match names exactly
   };
   for (const auto& [pattern, name, found] : rows)
     EXPECT_EQ(OrNull(TrovSearch(pattern, name.c_str())), found ? dir / found : "(null)")
