@@ -3,6 +3,8 @@
 
 #include <gtest/gtest.h>
 
+#include <clocale>
+
 #include "catalogue/documents.h"
 #include "catalogue/keywords.h"
 #include "test_support.h"
@@ -83,6 +85,32 @@ TEST(ProcessCommand, GrammarAndMissingControls) {
             (Calls{"search:\\section", "find:\\section/0", "select:0", "show:\\Section/1"}));
   KeywordListReset();
   DocumentCount = savedCount;
+}
+
+}  // namespace
+
+namespace {
+
+// Arguments are joined with blanks; only an argument holding a blank is
+// quoted; a line beyond 1023 bytes is cut, never inside a character.
+TEST(CommandLine, JoinsQuotesAndCuts) {
+  const std::wstring longWord(1022, L'x');
+  const struct {
+    std::vector<std::wstring> args;
+    std::string line;
+  } rows[] = {
+      {{L"prog"}, ""},
+      {{L"prog", L"a", L"b c", L"d"}, "a \"b c\" d"},
+      {{L"prog", L"", L"\"q\"\tt"}, " \"q\"\tt"},
+      {{L"prog", longWord + L"\u00e9"}, std::string(1022, 'x')},  // the two-byte character goes
+  };
+  std::setlocale(LC_ALL, "C.UTF-8");
+  for (const auto& row : rows) {
+    std::vector<const wchar_t*> argv;
+    for (const std::wstring& arg : row.args) argv.push_back(arg.c_str());
+    EXPECT_EQ(Command_Line(int(argv.size()), argv.data()), row.line);
+  }
+  std::setlocale(LC_ALL, "C");
 }
 
 }  // namespace

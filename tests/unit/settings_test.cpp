@@ -6,6 +6,7 @@
 #include <climits>
 #include <tuple>
 
+#include "base/trace.h"
 #include "platform/profile.h"
 #include "test_support.h"
 #include "wordindex/locate.h"
@@ -45,6 +46,26 @@ TEST_F(SettingsTest, SetupValuesFromTheTreeOrTheSystemDirectory) {
     std::filesystem::remove(dir_ / file);
   }
   EXPECT_EQ(FormatRootValue("%s%s", std::string(300, 'a').c_str()), std::string(255, 'a'));
+}
+
+}  // namespace
+
+namespace {
+
+// The trace's level comes from its words: the beginning first, then
+// WARNING, then ERROR, case-sensitively; the message holds 511 characters.
+TEST(Trace, LevelsFromTheWordsAndTheCut) {
+  const std::pair<const char*, int> rows[] = {
+      {"Openning document file: has ERROR", 2}, {"Attach document: /ERROR/x", 4},
+      {"a WARNING and an ERROR", 3},            {"run lower case", 1},
+      {"Launch", 2},                            {"plain", 1}};
+  for (const auto& [text, level] : rows) EXPECT_EQ(TraceLevelOf(text), level) << text;
+  testing_support::MessageCapture capture;
+  TraceMessage(std::string(600, 'a').c_str(), "tail");
+  TraceMessage("Private INI file: ", nullptr);
+  ASSERT_EQ(capture.messages().size(), 2u);
+  EXPECT_EQ(capture.messages()[0].text, std::string(511, 'a')) << "the text alone fills it";
+  EXPECT_EQ(capture.messages()[1].text, "Private INI file: ");
 }
 
 }  // namespace
