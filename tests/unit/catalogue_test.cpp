@@ -196,3 +196,42 @@ TEST_F(CatalogueTest, TreeLayoutFollowsTheTwoCachesAndTheChildSearch) {
 }
 
 }  // namespace
+
+namespace {
+
+// The pool's limits and packing, the keys' "#xx" decoding, the definition
+// file's name, and the keyword list's order with targets newest first.
+TEST_F(CatalogueTest, PoolKeysAndTheKeywordList) {
+  MessageCapture messages;
+  EXPECT_EQ(PoolAlloc(1, 64001), nullptr);
+  EXPECT_EQ(PoolAlloc(0, 24), nullptr);
+  EXPECT_TRUE(messages.Contains("PS ERROR: VM Range check in allocation 1 x 64001 = 64001"));
+  EXPECT_TRUE(messages.Contains("PS ERROR: VM Range check in allocation 0 x 24 = 0"));
+  char* a = static_cast<char*>(PoolAlloc(24, 1));
+  EXPECT_EQ(static_cast<char*>(PoolAlloc(24, 1)) - a, 24);
+  for (int i = PoolChunkCount(); i < kPoolMaxChunks; ++i) ASSERT_NE(PoolAlloc(1, 64000), nullptr);
+  EXPECT_EQ(PoolAlloc(1, 64000), nullptr);
+  EXPECT_TRUE(messages.Contains("PS ERROR: VM Memory allocation out VM chunk limit"));
+  PoolReset();
+
+  const std::pair<const char*, std::string> keys[] = {
+      {"#5Cbegin", "\\begin"}, {"a#4", "a\x04"}, {"x#", "x"}, {"#zz", std::string(1, '\0')}};
+  for (const auto& [key, decoded] : keys) {
+    char out[64];
+    const std::size_t n = DecodeKeyword(key, out, sizeof out);
+    EXPECT_EQ(std::string(out, n), decoded) << key;
+  }
+  const std::pair<const char*, const char*> names[] = {
+      {"guide.pdf", "guide.ddf"}, {"README", "README.ddf"}, {"a.b.c", "a.b.ddf"},
+      {"tex.v2/README", "tex.v2/README.ddf"}};
+  for (const auto& [file, ddf] : names) EXPECT_EQ(DefinitionFileName(file), ddf) << file;
+
+  AddKeywordTarget("Begin", "b1", 0);
+  AddKeywordTarget("\\section", "sec:1", 0);
+  AddKeywordTarget("begin", "b2", 1);
+  AddKeywordTarget("\\section", "sec:2", 1);
+  EXPECT_EQ(DumpList(), "\\section: sec:2@1 sec:1@0\nBegin: b2@1 b1@0\n");  // bytes after folding
+  EXPECT_EQ(FindKeyword("BEGIN"), KeywordListHead.Next->Next);
+}
+
+}  // namespace

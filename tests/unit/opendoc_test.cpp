@@ -408,3 +408,25 @@ TEST_F(OpenDocTest, LeftoverPartFilesOfKilledTransfersGo) {
 }
 
 }  // namespace
+
+namespace {
+
+// A cached copy counts as complete only with "%PDF-1" first and "startxref"
+// in its last 1024 bytes; which names are taken as they stand.
+TEST(OpenDocRules, CompleteCopiesAndAbsoluteNames) {
+  testing_support::TempDir dir;
+  const std::string pad(1100, ' ');
+  const std::pair<std::string, bool> files[] = {
+      {"%PDF-1.4 x startxref\n9\n%%EOF", true}, {"%PDF-1.4" + pad + "startxref", true},
+      {"%PDF-1.4 startxref" + pad, false},      {"%PDF-1", false},
+      {"%PDF-2.0 startxref", false},            {"<html>startxref</html>", false}};
+  for (const auto& [text, complete] : files)
+    EXPECT_EQ(Check_Loaded_PDF(dir.Write("f.pdf", text).c_str()), complete) << text.substr(0, 20);
+  EXPECT_FALSE(Check_Loaded_PDF((dir / "missing.pdf").c_str()));
+  for (const char* name : {"C:\\docs\\a.pdf", "c:x", "/docs/a.pdf", "\\\\server\\a.pdf"})
+    EXPECT_TRUE(Is_Absolute_Path(name)) << name;
+  for (const char* name : {"\\docs\\a.pdf", "docs/a.pdf", "1:x", ""})
+    EXPECT_FALSE(Is_Absolute_Path(name)) << name;
+}
+
+}  // namespace
