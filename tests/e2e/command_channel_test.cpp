@@ -1,4 +1,5 @@
 // The command channel between a running instance and later starts.
+#include <grp.h>
 #include <gtest/gtest.h>
 
 #include <algorithm>
@@ -151,6 +152,40 @@ TEST(CommandChannel, LaterStartsSayWhenTheirCommandIsNotDelivered) {
   EXPECT_EQ(off.status, 2);
   EXPECT_NE(off.Output().find("ERROR: MyApp::OnInit command channel off, command not delivered: x"),
             std::string::npos);
+  first.Stop();
+}
+
+}  // namespace
+
+namespace {
+
+// Another user who reaches the socket (every directory opened up) is
+// refused before anything is read; the owner is still served.
+TEST(CommandChannel, OtherUsersAreRefused) {
+  if (geteuid() != 0) GTEST_SKIP() << "needs root to become another user";
+  Sandbox box;
+  Process first = box.StartInstance();
+  for (auto dir = std::filesystem::path(box.socketPath()).parent_path();
+       dir.string().size() >= box.root().size(); dir = dir.parent_path())
+    chmod(dir.c_str(), 0755);
+  chmod(box.socketPath().c_str(), 0666);
+  const pid_t child = fork();
+  if (child == 0) {  // as nobody: open the conversation and send a command
+    if (setgroups(0, nullptr) != 0 || setgid(65534) != 0 || setuid(65534) != 0) _exit(200);
+    Raw channel;
+    if (!channel.Connect(box.socketPath())) _exit(201);
+    const bool accepted = channel.Open("CommandLine") == Raw::kConnect;
+    _exit(accepted ? 100 : 0);
+  }
+  int status = 0;
+  waitpid(child, &status, 0);
+  EXPECT_EQ(WIFEXITED(status) ? WEXITSTATUS(status) : -1, 0) << "the conversation was accepted";
+  EXPECT_TRUE(WaitFor([&] {
+    return HasPrefix(first.Lines(), "ERROR: DDE server connection of another user (uid 65534)");
+  })) << Describe(first.Lines());
+  chmod(box.runtimeDir().c_str(), 0700);
+  EXPECT_EQ(box.Run({"owner"}).status, 255);
+  ExpectEachOnce(first, {"owner"});
   first.Stop();
 }
 
