@@ -194,7 +194,9 @@ class Searcher {
       auto it = names.find(slash == std::string::npos ? variant : variant.substr(slash + 1));
       if (it == names.end()) continue;
       for (const auto& path : it->second) {
-        if (slash != std::string::npos && !HasTail(images ? ImageName(path) : path, variant))
+        // (a conditional expression would copy every path it looks at)
+        if (slash != std::string::npos &&
+            !(images ? HasTail(ImageName(path), variant) : HasTail(path, variant)))
           continue;
         if (executable_ && !IsRegularFile(path, true)) continue;
         int rank = rank_sizes_ ? IconSizeRank(path, root.dir.size()) : 0;
