@@ -61,9 +61,31 @@ std::string HeadBefore(const std::string& text, std::size_t at) {
   return std::string();
 }
 
+// True when some line of the page reads like an entry of a printed index:
+// a head word and a page number after it.
+bool HasIndexLine(const std::string& text) {
+  std::size_t begin = 0;
+  while (begin < text.size()) {
+    std::size_t end = text.find('\n', begin);
+    if (end == std::string::npos) end = text.size();
+    for (std::size_t i = begin; i < end; ++i)
+      if (text[i] >= '0' && text[i] <= '9') {
+        if (!IndexEntryHead(text.substr(begin, i - begin)).empty()) return true;
+        break;
+      }
+    begin = end + 1;
+  }
+  return false;
+}
+
 class Reader {
  public:
   explicit Reader(PopplerDocument* doc) : doc_(doc), pages_(poppler_document_get_n_pages(doc)) {}
+  ~Reader() {
+    if (destinations_) g_tree_destroy(destinations_);
+  }
+  Reader(const Reader&) = delete;
+  Reader& operator=(const Reader&) = delete;
 
   int Pages() const { return pages_; }
 
@@ -83,16 +105,18 @@ class Reader {
 
   // Physical page (from 1) a link leads to, and the name of its
   // destination when it has one; 0 when it leads nowhere in the document.
+  // Looking names up one by one fetches each from the file again; all of
+  // them read in one pass cost less than a few hundred lookups.
   int Target(PopplerAction* action, std::string& name) {
     if (action->type != POPPLER_ACTION_GOTO_DEST || !action->goto_dest.dest) return 0;
     PopplerDest* dest = action->goto_dest.dest;
     if (dest->type != POPPLER_DEST_NAMED) return dest->page_num;
-    name = dest->named_dest ? dest->named_dest : "";
-    PopplerDest* found = poppler_document_find_dest(doc_, dest->named_dest);
-    if (!found) return 0;
-    const int page = found->page_num;
-    poppler_dest_free(found);
-    return page;
+    if (!dest->named_dest) return 0;
+    name = dest->named_dest;
+    if (!destinations_) destinations_ = poppler_document_create_dests_tree(doc_);
+    if (!destinations_) return 0;
+    auto* found = static_cast<PopplerDest*>(g_tree_lookup(destinations_, dest->named_dest));
+    return found ? found->page_num : 0;
   }
 
   void ReadPage(int index, DocumentWords& words,
@@ -103,7 +127,9 @@ class Reader {
     gchar* text = poppler_page_get_text(page);
     t.text = text ? text : "";
     g_free(text);
-    const int pageLinks = ReadIndexLinks(page, t, words);
+    // Links are read only where a line looks like an index entry: most
+    // pages have none, and reading their annotations costs time.
+    const int pageLinks = HasIndexLine(t.text) ? ReadIndexLinks(page, t, words) : 0;
     if (pageLinks < kIndexPageLinks) {
       std::map<std::string, int> counts;
       for (const std::string& word : WordsOfText(t.text))
@@ -124,9 +150,7 @@ class Reader {
     bool haveLayout = false;
     for (GList* item = mapping; item; item = item->next) {
       auto* link = static_cast<PopplerLinkMapping*>(item->data);
-      std::string name;
-      const int target = Target(link->action, name);
-      if (target < 1 || target > pages_) continue;
+      if (link->action->type != POPPLER_ACTION_GOTO_DEST) continue;
       if (!haveLayout) {
         haveLayout = true;
         if (!poppler_page_get_text_layout(page, &t.rects, &t.rectCount)) t.rects = nullptr;
@@ -151,6 +175,9 @@ class Reader {
       // A page reference, not a code line number or a section number: the
       // text is the printed label of the page it leads to.
       if (!IsNumber(number)) continue;
+      std::string name;
+      const int target = Target(link->action, name);
+      if (target < 1 || target > pages_) continue;
       if (Label(target) != number && name != "page." + number) continue;
       const std::string head = HeadBefore(t.text, from);
       if (head.empty() || !IsUsableWord(head)) continue;
@@ -165,6 +192,7 @@ class Reader {
   PopplerDocument* doc_;
   int pages_;
   std::map<int, std::string> labels_;
+  GTree* destinations_ = nullptr;
 };
 
 }  // namespace
