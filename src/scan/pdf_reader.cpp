@@ -13,6 +13,11 @@ namespace {
 // A page with this many understood index links is a page of the printed
 // index: what it mentions is not counted as occurrences.
 constexpr int kIndexPageLinks = 5;
+// A page without index links is a page of a printed index from this many
+// lines that read like index entries on.
+constexpr std::size_t kIndexPageLines = 8;
+// Ranges of pages ("19–21") longer than this are taken for their ends only.
+constexpr int kLongestRange = 20;
 // How far up a continued page list looks for its entry's head.
 constexpr int kContinuationLines = 3;
 
@@ -61,21 +66,59 @@ std::string HeadBefore(const std::string& text, std::size_t at) {
   return std::string();
 }
 
-// True when some line of the page reads like an entry of a printed index:
-// a head word and a page number after it.
-bool HasIndexLine(const std::string& text) {
+// The lines of a page that read like entries of a printed index (a head
+// word, then its page numbers), with the numbers; a line of nothing but
+// numbers goes on the entry above it.  "19–21" stands for 19, 20 and 21.
+struct IndexLine {
+  std::string head;
+  std::vector<int> numbers;
+};
+
+std::vector<IndexLine> IndexLines(const std::string& text) {
+  std::vector<IndexLine> lines;
   std::size_t begin = 0;
   while (begin < text.size()) {
     std::size_t end = text.find('\n', begin);
     if (end == std::string::npos) end = text.size();
-    for (std::size_t i = begin; i < end; ++i)
-      if (text[i] >= '0' && text[i] <= '9') {
-        if (!IndexEntryHead(text.substr(begin, i - begin)).empty()) return true;
-        break;
-      }
+    const std::string line = text.substr(begin, end - begin);
     begin = end + 1;
+    const std::size_t digit = line.find_first_of("0123456789");
+    if (digit == std::string::npos) continue;
+    std::string head = IndexEntryHead(line.substr(0, digit));
+    if (head.empty()) {
+      if (lines.empty() || !IsPageListFiller(line)) continue;
+      head = lines.back().head;
+    } else if (!IsPageListFiller(line.substr(digit))) {
+      continue;
+    }
+    IndexLine entry{head, {}};
+    bool range = false;
+    for (std::size_t i = digit; i < line.size();) {
+      if (line[i] >= '0' && line[i] <= '9') {
+        std::size_t j = i;
+        while (j < line.size() && line[j] >= '0' && line[j] <= '9') ++j;
+        if (j - i > 5) break;
+        const int number = std::stoi(line.substr(i, j - i));
+        if (range && !entry.numbers.empty() && number > entry.numbers.back() &&
+            number - entry.numbers.back() < kLongestRange)
+          for (int n = entry.numbers.back() + 1; n < number; ++n) entry.numbers.push_back(n);
+        entry.numbers.push_back(number);
+        range = false;
+        i = j;
+      } else {
+        // A hyphen or an en dash (U+2013) joins the ends of a range.
+        if (line[i] == '-' || line.compare(i, 3, "\xE2\x80\x93") == 0) range = true;
+        if (line[i] == ',') range = false;
+        ++i;
+      }
+    }
+    if (lines.empty() || lines.back().head != head)
+      lines.push_back(entry);
+    else
+      lines.back().numbers.insert(lines.back().numbers.end(), entry.numbers.begin(),
+                                  entry.numbers.end());
   }
-  return false;
+  return lines;
 }
 
 class Reader {
@@ -129,8 +172,14 @@ class Reader {
     g_free(text);
     // Links are read only where a line looks like an index entry: most
     // pages have none, and reading their annotations costs time.
-    const int pageLinks = HasIndexLine(t.text) ? ReadIndexLinks(page, t, words) : 0;
-    if (pageLinks < kIndexPageLinks) {
+    std::vector<IndexLine> lines = IndexLines(t.text);
+    const int pageLinks = lines.empty() ? 0 : ReadIndexLinks(page, t, words);
+    // A page of a printed index without links: its numbers are printed
+    // page labels, resolved when the whole text is known.
+    const bool printedIndex = pageLinks == 0 && lines.size() >= kIndexPageLines;
+    if (printedIndex)
+      for (IndexLine& line : lines) printed_.push_back(std::move(line));
+    if (pageLinks < kIndexPageLinks && !printedIndex) {
       std::map<std::string, int> counts;
       for (const std::string& word : WordsOfText(t.text))
         if (IsUsableWord(word)) ++counts[word];
@@ -140,11 +189,46 @@ class Reader {
     g_object_unref(page);
   }
 
+  // The entries of a printed index without links: a number is the label
+  // of a page, and counts where that page, or one beside it (some indexes
+  // are off by one), shows the word.
+  void ResolvePrintedIndex(DocumentWords& words,
+                           const std::map<std::string, std::vector<PageCount>>& all) {
+    if (printed_.empty()) return;
+    std::map<std::string, int> physical;
+    for (int page = pages_; page >= 1; --page) physical[Label(page)] = page;
+    for (const IndexLine& line : printed_) {
+      if (!IsUsableWord(line.head)) continue;
+      auto found = all.find(line.head);
+      if (found == all.end()) continue;
+      auto shows = [&found](int page) {
+        for (const PageCount& p : found->second)
+          if (p.page == page) return true;
+        return false;
+      };
+      for (int number : line.numbers) {
+        auto at = physical.find(std::to_string(number));
+        if (at == physical.end()) continue;
+        for (int page : {at->second, at->second + 1, at->second - 1})
+          if (shows(page)) {
+            words.indexed[line.head].push_back(page);
+            ++words.indexLinks;
+            break;
+          }
+      }
+    }
+  }
+
  private:
   int ReadIndexLinks(PopplerPage* page, TextPosition& t, DocumentWords& words) {
     GList* mapping = poppler_page_get_link_mapping(page);
     if (!mapping) return 0;
-    int understood = 0;
+    struct Found {
+      std::size_t from, to;  // bytes of the number in the page's text
+      std::string head;
+      int page;
+    };
+    std::vector<Found> found;
     double width = 0, height = 0;
     poppler_page_get_size(page, &width, &height);
     bool haveLayout = false;
@@ -181,10 +265,25 @@ class Reader {
       if (Label(target) != number && name != "page." + number) continue;
       const std::string head = HeadBefore(t.text, from);
       if (head.empty() || !IsUsableWord(head)) continue;
-      words.indexed[head].push_back(target);
-      ++understood;
+      found.push_back(Found{from, to, head, target});
     }
     poppler_page_free_link_mapping(mapping);
+    // "19–21" links its two ends: the pages between belong to the entry too.
+    std::sort(found.begin(), found.end(),
+              [](const Found& a, const Found& b) { return a.from < b.from; });
+    for (std::size_t k = 0; k < found.size(); ++k) {
+      const Found& f = found[k];
+      std::vector<int>& pages = words.indexed[f.head];
+      if (k > 0 && found[k - 1].head == f.head && f.from > found[k - 1].to &&
+          f.page > found[k - 1].page && f.page - found[k - 1].page < kLongestRange) {
+        const std::string between =
+            Trimmed(t.text.substr(found[k - 1].to, f.from - found[k - 1].to));
+        if (between == "-" || between == "\xE2\x80\x93" || between == "--")
+          for (int page = found[k - 1].page + 1; page < f.page; ++page) pages.push_back(page);
+      }
+      pages.push_back(f.page);
+    }
+    const int understood = static_cast<int>(found.size());
     words.indexLinks += understood;
     return understood;
   }
@@ -193,6 +292,7 @@ class Reader {
   int pages_;
   std::map<int, std::string> labels_;
   GTree* destinations_ = nullptr;
+  std::vector<IndexLine> printed_;
 };
 
 }  // namespace
@@ -220,6 +320,7 @@ DocumentWords ReadPdfWords(const std::string& path) {
   words.pages = reader.Pages();
   std::map<std::string, std::vector<PageCount>> all;
   for (int i = 0; i < reader.Pages(); ++i) reader.ReadPage(i, words, all);
+  reader.ResolvePrintedIndex(words, all);
 
   for (auto& [word, pages] : words.indexed) {
     std::sort(pages.begin(), pages.end());

@@ -358,6 +358,12 @@ ScanResult Scan_Documentation(const ScanOptions& options) {
     }
   }
 
+  // The largest documents first, so that no core is left waiting for one
+  // at the end while the other is idle.
+  std::stable_sort(toRead.begin(), toRead.end(), [&documents](std::size_t a, std::size_t b) {
+    return documents[a].stamp.size > documents[b].stamp.size;
+  });
+
   ScanProgress progress;
   progress.total = pdfs;
   progress.done = pdfs - toRead.size();
