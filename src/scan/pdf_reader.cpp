@@ -18,6 +18,10 @@ constexpr int kIndexPageLinks = 5;
 constexpr std::size_t kIndexPageLines = 8;
 // Ranges of pages ("19–21") longer than this are taken for their ends only.
 constexpr int kLongestRange = 20;
+// Destinations looked up one by one before all are read at once.
+constexpr std::size_t kSingleLookups = 200;
+// Links are read on pages with at least this many lines like index entries.
+constexpr std::size_t kLinkedIndexLines = 2;
 // How far up a continued page list looks for its entry's head.
 constexpr int kContinuationLines = 3;
 
@@ -26,6 +30,9 @@ struct TextPosition {
   std::vector<std::size_t> charStart;  // byte offset of each character
   PopplerRectangle* rects = nullptr;
   guint rectCount = 0;
+  // Characters by the height of their middle, to find those of a link's
+  // area without going through the whole page for each link.
+  std::vector<std::pair<double, std::size_t>> byHeight;
 };
 
 void SplitCharacters(TextPosition& t) {
@@ -38,6 +45,16 @@ std::string Trimmed(const std::string& s) {
   while (b < e && (s[b] == ' ' || s[b] == '\n')) ++b;
   while (e > b && (s[e - 1] == ' ' || s[e - 1] == '\n')) --e;
   return s.substr(b, e - b);
+}
+
+// False for a link that cannot be a page reference whatever its
+// destination: a "page.N" destination fits only the number N.
+bool MayLeadToPage(PopplerAction* action, const std::string& number) {
+  if (action->type != POPPLER_ACTION_GOTO_DEST || !action->goto_dest.dest) return false;
+  const PopplerDest* dest = action->goto_dest.dest;
+  if (dest->type != POPPLER_DEST_NAMED || !dest->named_dest) return true;
+  const std::string name = dest->named_dest;
+  return name.compare(0, 5, "page.") != 0 || name.substr(5) == number;
 }
 
 bool IsNumber(const std::string& s) {
@@ -148,18 +165,28 @@ class Reader {
 
   // Physical page (from 1) a link leads to, and the name of its
   // destination when it has one; 0 when it leads nowhere in the document.
-  // Looking names up one by one fetches each from the file again; all of
-  // them read in one pass cost less than a few hundred lookups.
+  // A name looked up alone is fetched from the file again each time; all
+  // names read in one pass cost about as much as a few hundred lookups, so
+  // that is done once the document has needed that many.
   int Target(PopplerAction* action, std::string& name) {
     if (action->type != POPPLER_ACTION_GOTO_DEST || !action->goto_dest.dest) return 0;
     PopplerDest* dest = action->goto_dest.dest;
     if (dest->type != POPPLER_DEST_NAMED) return dest->page_num;
     if (!dest->named_dest) return 0;
     name = dest->named_dest;
-    if (!destinations_) destinations_ = poppler_document_create_dests_tree(doc_);
-    if (!destinations_) return 0;
-    auto* found = static_cast<PopplerDest*>(g_tree_lookup(destinations_, dest->named_dest));
-    return found ? found->page_num : 0;
+    auto known = looked_up_.find(name);
+    if (known != looked_up_.end()) return known->second;
+    int page = 0;
+    if (!destinations_ && looked_up_.size() >= kSingleLookups)
+      destinations_ = poppler_document_create_dests_tree(doc_);
+    if (destinations_) {
+      auto* found = static_cast<PopplerDest*>(g_tree_lookup(destinations_, dest->named_dest));
+      page = found ? found->page_num : 0;
+    } else if (PopplerDest* found = poppler_document_find_dest(doc_, dest->named_dest)) {
+      page = found->page_num;
+      poppler_dest_free(found);
+    }
+    return looked_up_[name] = page;
   }
 
   void ReadPage(int index, DocumentWords& words,
@@ -173,12 +200,15 @@ class Reader {
     // Links are read only where a line looks like an index entry: most
     // pages have none, and reading their annotations costs time.
     std::vector<IndexLine> lines = IndexLines(t.text);
-    const int pageLinks = lines.empty() ? 0 : ReadIndexLinks(page, t, words);
+    const int pageLinks = lines.size() < kLinkedIndexLines ? 0 : ReadIndexLinks(page, t, words);
     // A page of a printed index without links: its numbers are printed
     // page labels, resolved when the whole text is known.
     const bool printedIndex = pageLinks == 0 && lines.size() >= kIndexPageLines;
-    if (printedIndex)
+    if (printedIndex) {
+      // The index of documented code: most of its numbers are code lines.
+      if (t.text.find("code line") != std::string::npos) codeLineIndex_ = true;
       for (IndexLine& line : lines) printed_.push_back(std::move(line));
+    }
     if (pageLinks < kIndexPageLinks && !printedIndex) {
       std::map<std::string, int> counts;
       for (const std::string& word : WordsOfText(t.text))
@@ -194,7 +224,15 @@ class Reader {
   // are off by one), shows the word.
   void ResolvePrintedIndex(DocumentWords& words,
                            const std::map<std::string, std::vector<PageCount>>& all) {
-    if (printed_.empty()) return;
+    if (printed_.empty() || codeLineIndex_) return;
+    // Numbers beyond the last page say the same as "code line" does.
+    std::size_t numbers = 0, beyond = 0;
+    for (const IndexLine& line : printed_)
+      for (int number : line.numbers) {
+        ++numbers;
+        beyond += number > pages_ ? 1 : 0;
+      }
+    if (beyond * 10 > numbers) return;
     std::map<std::string, int> physical;
     for (int page = pages_; page >= 1; --page) physical[Label(page)] = page;
     for (const IndexLine& line : printed_) {
@@ -232,6 +270,7 @@ class Reader {
     double width = 0, height = 0;
     poppler_page_get_size(page, &width, &height);
     bool haveLayout = false;
+    const bool labelled = Label(1) != "1";
     for (GList* item = mapping; item; item = item->next) {
       auto* link = static_cast<PopplerLinkMapping*>(item->data);
       if (link->action->type != POPPLER_ACTION_GOTO_DEST) continue;
@@ -239,17 +278,23 @@ class Reader {
         haveLayout = true;
         if (!poppler_page_get_text_layout(page, &t.rects, &t.rectCount)) t.rects = nullptr;
         SplitCharacters(t);
+        const std::size_t n = t.rects ? std::min<std::size_t>(t.rectCount, t.charStart.size()) : 0;
+        for (std::size_t c = 0; c < n; ++c)
+          t.byHeight.emplace_back((t.rects[c].y1 + t.rects[c].y2) / 2, c);
+        std::sort(t.byHeight.begin(), t.byHeight.end());
       }
       // Link areas count from the bottom of the page, text from the top.
       const double top = height - link->area.y2, bottom = height - link->area.y1;
       std::size_t first = t.charStart.size(), last = 0;
-      const std::size_t n = std::min<std::size_t>(t.rectCount, t.charStart.size());
-      for (std::size_t c = 0; c < n; ++c) {
-        const PopplerRectangle& r = t.rects[c];
-        const double x = (r.x1 + r.x2) / 2, y = (r.y1 + r.y2) / 2;
-        if (x >= link->area.x1 && x <= link->area.x2 && y >= top && y <= bottom) {
-          first = std::min(first, c);
-          last = std::max(last, c);
+      const std::size_t n = t.byHeight.size();
+      for (auto c = std::lower_bound(t.byHeight.begin(), t.byHeight.end(),
+                                     std::make_pair(top, std::size_t{0}));
+           c != t.byHeight.end() && c->first <= bottom; ++c) {
+        const PopplerRectangle& r = t.rects[c->second];
+        const double x = (r.x1 + r.x2) / 2;
+        if (x >= link->area.x1 && x <= link->area.x2) {
+          first = std::min(first, c->second);
+          last = std::max(last, c->second);
         }
       }
       if (first >= n) continue;
@@ -259,6 +304,10 @@ class Reader {
       // A page reference, not a code line number or a section number: the
       // text is the printed label of the page it leads to.
       if (!IsNumber(number)) continue;
+      if (!MayLeadToPage(link->action, number)) continue;
+      // In a document whose pages have no labels of their own, a number
+      // beyond the last page is a code line: no need to look it up.
+      if (!labelled && std::stoi(number) > pages_) continue;
       std::string name;
       const int target = Target(link->action, name);
       if (target < 1 || target > pages_) continue;
@@ -292,7 +341,9 @@ class Reader {
   int pages_;
   std::map<int, std::string> labels_;
   GTree* destinations_ = nullptr;
+  std::map<std::string, int> looked_up_;
   std::vector<IndexLine> printed_;
+  bool codeLineIndex_ = false;
 };
 
 }  // namespace
