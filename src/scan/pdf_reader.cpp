@@ -211,8 +211,10 @@ class Reader {
     }
     if (pageLinks < kIndexPageLinks && !printedIndex) {
       std::map<std::string, int> counts;
-      for (const std::string& word : WordsOfText(t.text))
-        if (IsUsableWord(word)) ++counts[word];
+      std::vector<bool> described;
+      const std::vector<std::string> found = WordsOfText(t.text, &described);
+      for (std::size_t k = 0; k < found.size(); ++k)
+        if (IsUsableWord(found[k])) counts[found[k]] += described[k] ? kDescribedWeight : 1;
       for (const auto& [word, count] : counts) all[word].push_back(PageCount{index + 1, count});
     }
     g_free(t.rects);

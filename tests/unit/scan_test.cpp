@@ -186,7 +186,7 @@ TEST_F(ScanTree, CacheReadsOnlyWhatChanged) {
       {"unchanged", [] {}, 0, 5},
       {"changed", [this] { Plain("latex/demo/plain.pdf", "Now \\renewcommand"); }, 1, 5},
       {"removed", [this] { fs::remove(tree / "doc/latex/bad/locked.pdf"); }, 0, 4},
-      {"damaged cache", [&] { std::ofstream(cache) << "docuvane-scan-cache 1\ndoc 99\tx\n"; }, 3,
+      {"damaged cache", [&] { std::ofstream(cache) << "docuvane-scan-cache 2\ndoc 99\tx\n"; }, 3,
        4},
   };
   for (const auto& row : rows) {
