@@ -1,6 +1,5 @@
-// A scanned tree in the real program: the scanner reads a manual made by
-// the project's PDF maker, and the window started on its index takes a
-// word and looks it up.
+// A scanned tree in the real program: a manual made by the project's PDF
+// maker is scanned, and the window started on its index looks a word up.
 #include <gtest/gtest.h>
 
 #include <cstdio>
