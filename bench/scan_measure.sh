@@ -15,12 +15,16 @@ now() { date +%s.%N; }
 find -L "$tree/doc" -name '*.pdf' | sort > "$work/pdfs"
 echo "PDFs: $(wc -l < "$work/pdfs")"
 
+echo "load before: $(uptime)"
 t0=$(now)
-/usr/bin/time -f "%M" -o "$work/peak" "$tool" --scan "$tree" 2> "$work/scan.err"
+/usr/bin/time -f "%M %U %S" -o "$work/peak" "$tool" --scan "$tree" 2> "$work/scan.err"
 t1=$(now)
 tail -1 "$work/scan.err"
 echo "warnings: $(grep -c warning "$work/scan.err" || true)"
-echo "full scan: $(echo "$t1 - $t0" | bc) s wall, peak RSS of the scanner $(cat "$work/peak") KiB"
+scan=$(echo "$t1 - $t0" | bc)
+read -r peak user sys < "$work/peak"
+echo "full scan: $scan s wall, $(echo "$user + $sys" | bc) s CPU (all processes)," \
+  "largest RSS of one process $peak KiB"
 
 t0=$(now)
 "$tool" --scan "$tree" 2> /dev/null
@@ -29,6 +33,11 @@ echo "re-scan, nothing changed: $(echo "$t1 - $t0" | bc) s"
 echo "index: $(stat -c %s "$work/cache/lomari/texmf/Update/command.Index") bytes"
 
 t0=$(now)
-while read -r pdf; do pdftotext -q "$pdf" - > /dev/null || true; done < "$work/pdfs"
+/usr/bin/time -f "%U %S" -o "$work/cpu" sh -c \
+  'while read -r pdf; do pdftotext -q "$pdf" - > /dev/null || true; done' < "$work/pdfs"
 t1=$(now)
-echo "pdftotext one after another: $(echo "$t1 - $t0" | bc) s wall"
+seq=$(echo "$t1 - $t0" | bc)
+read -r user sys < "$work/cpu"
+echo "pdftotext one after another: $seq s wall, $(echo "$user + $sys" | bc) s CPU"
+echo "ratio full scan / pdftotext: $(echo "scale=2; $scan / $seq" | bc)"
+echo "load after: $(uptime)"

@@ -1,6 +1,6 @@
 // Running work where a crash, a hang or a runaway allocation cannot reach
-// the caller: each job runs in a child process of its own, with a time and
-// an address-space limit, and hands its result back through a pipe.
+// the caller: jobs run in child processes, with a time limit per job and an
+// address-space limit, and hand their results back through a socket.
 #pragma once
 
 #include <cstddef>
@@ -17,15 +17,19 @@ struct IsolatedOutcome {
 struct IsolationLimits {
   int parallel = 1;                    // children at once
   int timeoutMs = 60000;               // wall time per job
-  std::size_t memoryBytes = 1u << 30;  // address space per child; 0 = no limit
+  std::size_t memoryBytes = 1u << 30;  // address space per worker; 0 = no limit
 };
 
-// Runs job(i) for i in [0, count) in forked children, at most
-// `limits.parallel` at a time; `done(i, outcome)` is called in the caller's
-// process as each job ends, in the order they end.  `done` returning false
-// stops the run: running children are killed and no more are started.
-// Returns false when the run was stopped.  The job must not rely on
-// threads of the caller; it runs in a copy of the process made by fork.
+// Runs job(i) for i in [0, count), in order of i, in forked worker
+// processes, at most `limits.parallel` at a time; each worker runs one job
+// after another (a new worker is started after a crash, a timeout, or a
+// few dozen jobs), and a job that fails in a worker that had run others is
+// run once more in a fresh one.  `done(i, outcome)` is called in the
+// caller's process as each job ends, in the order they end.  `done`
+// returning false stops the run: running workers are killed and no more
+// jobs are started.  Returns false when the run was stopped.  The job must
+// not rely on threads of the caller; it runs in a copy of the process made
+// by fork.
 bool RunIsolated(std::size_t count, const IsolationLimits& limits,
                  const std::function<std::string(std::size_t)>& job,
                  const std::function<bool(std::size_t, IsolatedOutcome&)>& done);

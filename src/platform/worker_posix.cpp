@@ -1,15 +1,20 @@
-// Forked, limited children for work that may crash or hang.
+// Forked, limited worker processes for work that may crash or hang.
 #include <errno.h>
 #include <fcntl.h>
 #include <poll.h>
 #include <signal.h>
 #include <spawn.h>
 #include <sys/resource.h>
+#include <sys/socket.h>
 #include <sys/wait.h>
 #include <unistd.h>
 
+#include <algorithm>
 #include <chrono>
+#include <cstdint>
 #include <cstdio>
+#include <cstring>
+#include <deque>
 #include <vector>
 
 #include "platform/worker.h"
@@ -20,19 +25,28 @@ namespace {
 
 using Clock = std::chrono::steady_clock;
 
-struct Running {
-  std::size_t job = 0;
+// A worker is replaced after this many jobs, so what jobs leave behind
+// cannot pile up.
+constexpr std::size_t kJobsPerWorker = 64;
+
+// A worker: a forked child that runs the jobs it is sent one at a time
+// over a socket (8 bytes, the job's number) and answers each with its
+// number, the result's length and the result.
+struct Worker {
   pid_t pid = -1;
   int fd = -1;
+  bool busy = false;
+  std::size_t job = 0;
+  std::size_t ran = 0;  // jobs sent to it so far
   Clock::time_point deadline;
-  std::string output;
-  bool eof = false;
+  std::string input;  // answer bytes not yet complete
 };
 
-bool WriteAll(int fd, const std::string& data) {
+bool WriteAll(int fd, const void* data, std::size_t size) {
+  const char* bytes = static_cast<const char*>(data);
   std::size_t done = 0;
-  while (done < data.size()) {
-    ssize_t n = write(fd, data.data() + done, data.size() - done);
+  while (done < size) {
+    const ssize_t n = send(fd, bytes + done, size - done, MSG_NOSIGNAL);
     if (n < 0 && errno == EINTR) continue;
     if (n <= 0) return false;
     done += static_cast<std::size_t>(n);
@@ -40,25 +54,68 @@ bool WriteAll(int fd, const std::string& data) {
   return true;
 }
 
-void LimitChild(const IsolationLimits& limits) {
+bool ReadAll(int fd, void* data, std::size_t size) {
+  char* bytes = static_cast<char*>(data);
+  std::size_t done = 0;
+  while (done < size) {
+    const ssize_t n = read(fd, bytes + done, size - done);
+    if (n < 0 && errno == EINTR) continue;
+    if (n <= 0) return false;
+    done += static_cast<std::size_t>(n);
+  }
+  return true;
+}
+
+double CpuSeconds() {
+  rusage usage{};
+  getrusage(RUSAGE_SELF, &usage);
+  return static_cast<double>(usage.ru_utime.tv_sec + usage.ru_stime.tv_sec) +
+         static_cast<double>(usage.ru_utime.tv_usec + usage.ru_stime.tv_usec) / 1e6;
+}
+
+// The parent kills a job at its deadline; the processor time limit, moved
+// on before every job, is for a parent that is gone.
+void LimitCpu(const IsolationLimits& limits) {
+  rlimit cpu{};
+  getrlimit(RLIMIT_CPU, &cpu);
+  const rlim_t seconds =
+      static_cast<rlim_t>(CpuSeconds()) + static_cast<rlim_t>(limits.timeoutMs / 1000 + 2);
+  cpu.rlim_cur = cpu.rlim_max == RLIM_INFINITY ? seconds : std::min(seconds, cpu.rlim_max);
+  setrlimit(RLIMIT_CPU, &cpu);
+}
+
+[[noreturn]] void Serve(int fd, const IsolationLimits& limits,
+                        const std::function<std::string(std::size_t)>& work) {
   if (limits.memoryBytes > 0) {
     rlimit memory{limits.memoryBytes, limits.memoryBytes};
     setrlimit(RLIMIT_AS, &memory);
   }
-  // The parent kills at the deadline; this is for a parent that is gone.
-  const rlim_t seconds = static_cast<rlim_t>(limits.timeoutMs / 1000 + 2);
-  rlimit cpu{seconds, seconds + 1};
-  setrlimit(RLIMIT_CPU, &cpu);
   rlimit core{0, 0};
   setrlimit(RLIMIT_CORE, &core);
+  // Nothing may leave the child but its results: an exception unwinding
+  // into the caller's code would go on running the caller in two copies.
+  try {
+    std::uint64_t job = 0;
+    while (ReadAll(fd, &job, sizeof job)) {
+      LimitCpu(limits);
+      const std::string result = work(static_cast<std::size_t>(job));
+      const std::uint64_t head[2] = {job, result.size()};
+      if (!WriteAll(fd, head, sizeof head) || !WriteAll(fd, result.data(), result.size())) _exit(3);
+    }
+    _exit(0);
+  } catch (...) {
+    _exit(4);
+  }
 }
 
-bool Launch(std::size_t job, const IsolationLimits& limits,
-            const std::function<std::string(std::size_t)>& work, Running& child) {
+// `others`: the sockets of the other workers, which the new one must not
+// keep open (a worker sees the end of its jobs when its socket closes).
+bool Start(const IsolationLimits& limits, const std::function<std::string(std::size_t)>& work,
+           const std::vector<Worker>& others, Worker& worker) {
   int fds[2];
-  if (pipe2(fds, O_CLOEXEC) != 0) return false;
+  if (socketpair(AF_UNIX, SOCK_STREAM | SOCK_CLOEXEC, 0, fds) != 0) return false;
   std::fflush(nullptr);
-  pid_t pid = fork();
+  const pid_t pid = fork();
   if (pid < 0) {
     close(fds[0]);
     close(fds[1]);
@@ -66,61 +123,62 @@ bool Launch(std::size_t job, const IsolationLimits& limits,
   }
   if (pid == 0) {
     close(fds[0]);
-    LimitChild(limits);
-    // Nothing may leave the child but its result: an exception unwinding
-    // into the caller's code would go on running the caller in two copies.
-    try {
-      const std::string result = work(job);
-      _exit(WriteAll(fds[1], result) ? 0 : 3);
-    } catch (...) {
-      _exit(4);
-    }
+    for (const Worker& other : others)
+      if (other.fd >= 0) close(other.fd);
+    Serve(fds[1], limits, work);
   }
   close(fds[1]);
   fcntl(fds[0], F_SETFL, fcntl(fds[0], F_GETFL) | O_NONBLOCK);
-  child.job = job;
-  child.pid = pid;
-  child.fd = fds[0];
-  child.deadline = Clock::now() + std::chrono::milliseconds(limits.timeoutMs);
-  child.output.clear();
-  child.eof = false;
+  worker = Worker();
+  worker.pid = pid;
+  worker.fd = fds[0];
   return true;
 }
 
-void Drain(Running& child) {
-  char buffer[65536];
-  for (;;) {
-    ssize_t n = read(child.fd, buffer, sizeof buffer);
-    if (n > 0) {
-      child.output.append(buffer, static_cast<std::size_t>(n));
-      continue;
-    }
-    if (n < 0 && errno == EINTR) continue;
-    if (n == 0) child.eof = true;
-    return;
-  }
-}
-
-IsolatedOutcome Reap(Running& child, bool killed) {
+// Ends a worker (killing it first when `kill`), and tells how its current
+// job ended when it had one.
+IsolatedOutcome Stop(Worker& worker, bool killIt) {
   IsolatedOutcome outcome;
-  if (killed) kill(child.pid, SIGKILL);
+  if (killIt) kill(worker.pid, SIGKILL);
+  close(worker.fd);
   int status = 0;
-  while (waitpid(child.pid, &status, 0) < 0 && errno == EINTR) {
+  while (waitpid(worker.pid, &status, 0) < 0 && errno == EINTR) {
   }
-  close(child.fd);
-  if (killed) {
+  worker.pid = -1;
+  worker.fd = -1;
+  if (killIt) {
     outcome.status = IsolatedOutcome::TimedOut;
   } else if (WIFSIGNALED(status)) {
     outcome.status =
         WTERMSIG(status) == SIGXCPU ? IsolatedOutcome::TimedOut : IsolatedOutcome::Crashed;
     outcome.signal = WTERMSIG(status);
-  } else if (WIFEXITED(status) && WEXITSTATUS(status) == 0) {
-    outcome.status = IsolatedOutcome::Done;
-    outcome.output.swap(child.output);
   } else {
     outcome.status = IsolatedOutcome::Failed;
   }
   return outcome;
+}
+
+// Reads what the worker sent; true when its current job's answer is
+// complete (`output` set), `ended` when the worker is gone.
+bool Receive(Worker& worker, std::string& output, bool& ended) {
+  char buffer[65536];
+  for (;;) {
+    const ssize_t n = read(worker.fd, buffer, sizeof buffer);
+    if (n > 0) {
+      worker.input.append(buffer, static_cast<std::size_t>(n));
+      continue;
+    }
+    if (n < 0 && errno == EINTR) continue;
+    ended = n == 0 || (errno != EAGAIN && errno != EWOULDBLOCK);
+    break;
+  }
+  std::uint64_t head[2];
+  if (worker.input.size() < sizeof head) return false;
+  std::memcpy(head, worker.input.data(), sizeof head);
+  if (head[0] != worker.job || head[1] > worker.input.size() - sizeof head) return false;
+  output = worker.input.substr(sizeof head, head[1]);
+  worker.input.erase(0, sizeof head + head[1]);
+  return true;
 }
 
 }  // namespace
@@ -129,53 +187,84 @@ bool RunIsolated(std::size_t count, const IsolationLimits& limits,
                  const std::function<std::string(std::size_t)>& job,
                  const std::function<bool(std::size_t, IsolatedOutcome&)>& done) {
   const std::size_t parallel = limits.parallel < 1 ? 1 : static_cast<std::size_t>(limits.parallel);
-  std::vector<Running> running;
-  std::size_t next = 0;
+  std::deque<std::size_t> queue;
+  for (std::size_t i = 0; i < count; ++i) queue.push_back(i);
+  std::vector<bool> retried(count);
+  std::vector<Worker> workers(std::min(parallel, count));
   bool stopped = false;
-  while (!stopped && (next < count || !running.empty())) {
-    while (next < count && running.size() < parallel) {
-      Running child;
-      if (Launch(next, limits, job, child)) {
-        running.push_back(child);
-      } else {
-        IsolatedOutcome failed;
-        if (!done(next, failed)) stopped = true;
-      }
-      ++next;
-      if (stopped) break;
+  auto finish = [&](std::size_t which, IsolatedOutcome& outcome) {
+    if (!done(which, outcome)) stopped = true;
+  };
+  // A job that fails in a worker that had run others before is run once
+  // more in a fresh one: what the earlier jobs left behind (memory, the PDF
+  // library's state) must not be what skips a document.
+  auto ended = [&](Worker& w, bool late) {
+    IsolatedOutcome outcome = Stop(w, late);
+    if (!w.busy) return;
+    w.busy = false;
+    if (!late && w.ran > 1 && !retried[w.job]) {
+      retried[w.job] = true;
+      queue.push_front(w.job);
+      return;
     }
-    if (stopped || running.empty()) continue;
+    finish(w.job, outcome);
+  };
 
+  for (;;) {
+    for (Worker& w : workers) {
+      if (stopped || w.busy || queue.empty()) continue;
+      if (w.pid >= 0 && w.ran >= kJobsPerWorker) Stop(w, false);
+      if (w.pid < 0 && !Start(limits, job, workers, w)) {
+        IsolatedOutcome failed;
+        const std::size_t which = queue.front();
+        queue.pop_front();
+        finish(which, failed);
+        continue;
+      }
+      const std::uint64_t next = queue.front();
+      if (!WriteAll(w.fd, &next, sizeof next)) {
+        ended(w, false);
+        continue;
+      }
+      queue.pop_front();
+      w.busy = true;
+      w.job = static_cast<std::size_t>(next);
+      ++w.ran;
+      w.deadline = Clock::now() + std::chrono::milliseconds(limits.timeoutMs);
+    }
     std::vector<pollfd> polls;
-    for (const Running& r : running) polls.push_back(pollfd{r.fd, POLLIN, 0});
-    auto wait = std::chrono::duration_cast<std::chrono::milliseconds>(running.front().deadline -
-                                                                      Clock::now());
-    for (const Running& r : running)
-      wait = std::min(
-          wait, std::chrono::duration_cast<std::chrono::milliseconds>(r.deadline - Clock::now()));
-    const int timeout =
-        static_cast<int>(std::max<long long>(0, std::min<long long>(wait.count(), 1000)));
+    std::vector<Worker*> polled;
+    Clock::time_point first = Clock::time_point::max();
+    for (Worker& w : workers)
+      if (w.busy) {
+        polls.push_back(pollfd{w.fd, POLLIN, 0});
+        polled.push_back(&w);
+        first = std::min(first, w.deadline);
+      }
+    if (stopped || (polls.empty() && queue.empty())) break;
+    if (polls.empty()) continue;  // a worker went away before its job; start another
+    const auto wait =
+        std::chrono::duration_cast<std::chrono::milliseconds>(first - Clock::now()).count();
+    const int timeout = static_cast<int>(std::max<long long>(0, std::min<long long>(wait, 1000)));
     if (poll(polls.data(), polls.size(), timeout) < 0 && errno != EINTR) break;
 
     const Clock::time_point now = Clock::now();
-    for (std::size_t i = 0; i < running.size();) {
-      Running& r = running[i];
-      Drain(r);
-      const bool late = !r.eof && now >= r.deadline;
-      if (r.eof || late) {
-        IsolatedOutcome outcome = Reap(r, late);
-        const std::size_t which = r.job;
-        running.erase(running.begin() + static_cast<long>(i));
-        if (!done(which, outcome)) {
-          stopped = true;
-          break;
-        }
-      } else {
-        ++i;
+    for (std::size_t i = 0; i < polled.size() && !stopped; ++i) {
+      Worker& w = *polled[i];
+      if (polls[i].revents == 0 && now < w.deadline) continue;
+      IsolatedOutcome outcome;
+      bool gone = false;
+      if (Receive(w, outcome.output, gone)) {
+        w.busy = false;
+        outcome.status = IsolatedOutcome::Done;
+        finish(w.job, outcome);
+        continue;
       }
+      if (gone || now >= w.deadline) ended(w, !gone);
     }
   }
-  for (Running& r : running) Reap(r, true);
+  for (Worker& w : workers)
+    if (w.pid >= 0) Stop(w, w.busy);
   return !stopped;
 }
 

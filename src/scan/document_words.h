@@ -8,8 +8,13 @@
 
 struct PageCount {
   int page = 0;   // physical, from 1
-  int count = 0;  // occurrences on that page
+  int count = 0;  // occurrences on that page, kDescribedWeight for each shown
+                  // with meta-variable arguments
 };
+
+// What one occurrence of a word shown with its arguments counts for: the
+// page that describes a command ranks before pages that only use it.
+constexpr int kDescribedWeight = 20;
 
 struct DocumentWords {
   std::string error;  // not empty: the document could not be read, and why

@@ -35,7 +35,9 @@ constexpr int kIndexedDocumentLinks = 10;
 // indexes and names give is always kept.
 constexpr std::size_t kOccurrenceDocuments = 40;
 constexpr int kMaxDirectoryDepth = 24;
-const char kCacheMagic[] = "docuvane-scan-cache 1";
+const char kCacheMagic[] = "docuvane-scan-cache 2";
+// Caches of other versions count the words otherwise: read again, quietly.
+const char kCacheFamily[] = "docuvane-scan-cache ";
 
 struct Document {
   std::string label;  // relative to the tree's doc/
@@ -146,7 +148,12 @@ bool ReadCache(const std::string& file, std::map<std::string, std::string>& entr
   if (!PathExists(file)) return true;
   if (!ReadWholeFile(file, text, std::size_t{1} << 31)) return false;
   const std::string head = std::string(kCacheMagic) + "\n";
-  if (text.compare(0, head.size(), head) != 0) return false;
+  if (text.compare(0, head.size(), head) != 0) {
+    const std::size_t family = std::char_traits<char>::length(kCacheFamily);
+    const std::size_t eol = text.find('\n');
+    return text.compare(0, family, kCacheFamily) == 0 && eol != std::string::npos && eol > family &&
+           eol < family + 8;
+  }
   std::size_t at = head.size();
   std::size_t count = 0;
   while (at < text.size()) {
@@ -247,8 +254,12 @@ std::map<std::string, std::vector<Candidate>> Locations(
                                  ? kOccurrencePagesBesideIndex
                                  : kOccurrencePages;
     for (const auto& [word, counts] : d.words.occurs) {
+      // Pages that describe the word, when there are such: the others only
+      // use it.
+      const bool described = !counts.empty() && counts[0].count >= kDescribedWeight;
       std::vector<int> pages;
-      for (std::size_t k = 0; k < counts.size() && k < keep; ++k) pages.push_back(counts[k].page);
+      for (std::size_t k = 0; k < counts.size() && k < keep; ++k)
+        if (!described || counts[k].count >= kDescribedWeight) pages.push_back(counts[k].page);
       auto total = d.words.totals.find(word);
       Add(words, word, i, 2, total == d.words.totals.end() ? 0 : total->second, pages);
     }
@@ -357,6 +368,12 @@ ScanResult Scan_Documentation(const ScanOptions& options) {
       toRead.push_back(i);
     }
   }
+
+  // The largest documents first, so that no core is left waiting for one
+  // at the end while the other is idle.
+  std::stable_sort(toRead.begin(), toRead.end(), [&documents](std::size_t a, std::size_t b) {
+    return documents[a].stamp.size > documents[b].stamp.size;
+  });
 
   ScanProgress progress;
   progress.total = pdfs;

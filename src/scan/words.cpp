@@ -58,10 +58,21 @@ bool IsPackageName(const std::string& name) {
   return true;
 }
 
+// True when an argument with a meta-variable follows at `at`: blanks, an
+// optional star and blanks, then "{⟨" or "[⟨" (U+27E8).
+bool MetaArgumentAt(const std::string& text, std::size_t at) {
+  while (at < text.size() && text[at] == ' ') ++at;
+  if (at < text.size() && text[at] == '*') ++at;
+  while (at < text.size() && text[at] == ' ') ++at;
+  if (at >= text.size() || (text[at] != '{' && text[at] != '[')) return false;
+  return text.compare(at + 1, 3, "\xE2\x9F\xA8") == 0;
+}
+
 }  // namespace
 
-std::vector<std::string> WordsOfText(const std::string& text) {
+std::vector<std::string> WordsOfText(const std::string& text, std::vector<bool>* described) {
   std::vector<std::string> words;
+  if (described) described->clear();
   std::size_t i = 0;
   while (i < text.size()) {
     if (!BackslashAt(text, i)) {
@@ -81,6 +92,7 @@ std::vector<std::string> WordsOfText(const std::string& text) {
           const std::string name = text.substr(j + 1, close - j - 1);
           if (IsEnvironmentName(name)) {
             words.push_back("{" + name + "}");
+            if (described) described->push_back(false);
             i = close + 1;
             continue;
           }
@@ -88,6 +100,7 @@ std::vector<std::string> WordsOfText(const std::string& text) {
       }
     }
     words.push_back(command);
+    if (described) described->push_back(MetaArgumentAt(text, i));
   }
   return words;
 }

@@ -9,7 +9,11 @@
 // The words of `text` in order, one per occurrence: every command, and
 // "{name}" for every \begin{name}.  Text is UTF-8; the backslash may also
 // come as the "set minus" sign some fonts map it to.
-std::vector<std::string> WordsOfText(const std::string& text);
+// With `described`, one flag per word: true where the word is shown with
+// its arguments as meta-variables ("\\scalebox{⟨h-scale⟩}"), as manuals
+// show what they explain.
+std::vector<std::string> WordsOfText(const std::string& text,
+                                     std::vector<bool>* described = nullptr);
 
 // The word that a printed index line stands for, from the text before its
 // first page number: "\section . . ." gives "\section", "align

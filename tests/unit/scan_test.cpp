@@ -86,6 +86,24 @@ TEST(Isolation, AFailingJobIsReportedAndTheOthersFinish) {
   EXPECT_NE(outcomes[3].status, IsolatedOutcome::Done);
 }
 
+// One worker runs many jobs; what an earlier job leaves behind (here: a
+// count kept in the worker) does not skip a later one, which runs again.
+TEST(Isolation, AJobFailingAfterOthersInItsWorkerRunsAgainInAFreshOne) {
+  static int ranHere = 0;  // per worker process
+  std::map<std::size_t, IsolatedOutcome> outcomes;
+  RunIsolated(
+      6, IsolationLimits{},
+      [](std::size_t i) -> std::string {
+        if (i == 4 && ranHere > 0) std::raise(SIGSEGV);
+        return std::to_string(++ranHere);
+      },
+      [&](std::size_t i, IsolatedOutcome& o) { return outcomes.emplace(i, o).second; });
+  ASSERT_EQ(outcomes.size(), 6u);
+  EXPECT_EQ(outcomes[3].output, "4");  // no fork per job
+  EXPECT_EQ(outcomes[4].output, "1");
+  EXPECT_EQ(outcomes[5].output, "2");
+}
+
 // A tree with a manual (index with page labels and links), a plain PDF, a
 // damaged and an encrypted one, HTML pages, and a package.
 class ScanTree : public ::testing::Test {
@@ -165,8 +183,7 @@ TEST_F(ScanTree, IndexPagesAreThePhysicalPagesTheIndexLinksTo) {
       {"guide", "html/guide/index.html", "1"},
       {"locked", "latex/bad/locked.pdf", "1"},  // unreadable, still catalogued
   };
-  for (const auto& row : rows)
-    EXPECT_EQ(index[row.word][row.label], row.pages) << row.word;
+  for (const auto& row : rows) EXPECT_EQ(index[row.word][row.label], row.pages) << row.word;
   // Code line 17 links to physical page 2, labelled "ii": not a page.
   EXPECT_EQ(index["\\foo"]["latex/demo/manual.pdf"].find("2"), std::string::npos);
   EXPECT_EQ(index.count("one"), 0u);
@@ -186,7 +203,7 @@ TEST_F(ScanTree, CacheReadsOnlyWhatChanged) {
       {"unchanged", [] {}, 0, 5},
       {"changed", [this] { Plain("latex/demo/plain.pdf", "Now \\renewcommand"); }, 1, 5},
       {"removed", [this] { fs::remove(tree / "doc/latex/bad/locked.pdf"); }, 0, 4},
-      {"damaged cache", [&] { std::ofstream(cache) << "docuvane-scan-cache 1\ndoc 99\tx\n"; }, 3,
+      {"damaged cache", [&] { std::ofstream(cache) << "docuvane-scan-cache 2\ndoc 99\tx\n"; }, 3,
        4},
   };
   for (const auto& row : rows) {
