@@ -84,9 +84,23 @@ void LimitCpu(const IsolationLimits& limits) {
   setrlimit(RLIMIT_CPU, &cpu);
 }
 
+#if defined(__SANITIZE_ADDRESS__)
+constexpr bool kAddressSanitizer = true;
+#elif defined(__has_feature)
+#if __has_feature(address_sanitizer)
+constexpr bool kAddressSanitizer = true;
+#else
+constexpr bool kAddressSanitizer = false;
+#endif
+#else
+constexpr bool kAddressSanitizer = false;
+#endif
+
 [[noreturn]] void Serve(int fd, const IsolationLimits& limits,
                         const std::function<std::string(std::size_t)>& work) {
-  if (limits.memoryBytes > 0) {
+  // An address-space limit would starve AddressSanitizer's shadow memory,
+  // which reserves terabytes up front; sanitized test builds go without it.
+  if (limits.memoryBytes > 0 && !kAddressSanitizer) {
     rlimit memory{limits.memoryBytes, limits.memoryBytes};
     setrlimit(RLIMIT_AS, &memory);
   }

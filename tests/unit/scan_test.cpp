@@ -83,7 +83,9 @@ TEST(Isolation, AFailingJobIsReportedAndTheOthersFinish) {
   EXPECT_EQ(outcomes[0].output, "fine");
   EXPECT_EQ(outcomes[1].status, IsolatedOutcome::Crashed);
   EXPECT_EQ(outcomes[2].status, IsolatedOutcome::TimedOut);
+#ifndef __SANITIZE_ADDRESS__  // sanitized builds run their workers without a memory limit
   EXPECT_NE(outcomes[3].status, IsolatedOutcome::Done);
+#endif
 }
 
 // One worker runs many jobs; what an earlier job leaves behind (here: a
