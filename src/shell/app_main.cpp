@@ -40,6 +40,21 @@ constexpr unsigned kChannelOffStatus = 2;
 
 void Phase(const char* phase) { TraceMessage("Docuvane::OnInit --- ", phase); }
 
+// The instance lock, taken in main before the toolkit starts: the running
+// instance can then set work going that needs no toolkit while the toolkit
+// loads.  OnInit takes it over.
+std::unique_ptr<InstanceLock> g_earlyLock;
+
+std::unique_ptr<InstanceLock> TakeInstanceLock() {
+  const std::string user = wxGetUserId().ToStdString();
+  char lockName[256];
+  std::snprintf(lockName, sizeof lockName, "Lomari-Docuvane-%s", user.c_str());
+  std::unique_ptr<InstanceLock> lock(new InstanceLock);
+  lock->Create(lockName);
+  if (!lock->error().empty()) TrovMessage("ERROR: InstanceLock ", lock->error().c_str(), 5);
+  return lock;
+}
+
 }  // namespace
 
 class MyApp : public wxApp {
@@ -64,15 +79,12 @@ wxEND_EVENT_TABLE()
     wxIMPLEMENT_APP_NO_MAIN(MyApp);
 
 bool MyApp::OnInit() {
-  Phase("Start");
-
-  const std::string user = wxGetUserId().ToStdString();
-  char lockName[256];
-  std::snprintf(lockName, sizeof lockName, "Lomari-Docuvane-%s", user.c_str());
-  m_checker.reset(new InstanceLock);
-  m_checker->Create(lockName);
-  if (!m_checker->error().empty())
-    TrovMessage("ERROR: InstanceLock ", m_checker->error().c_str(), 5);
+  if (g_earlyLock) {
+    m_checker = std::move(g_earlyLock);
+  } else {
+    Phase("Start");
+    m_checker = TakeInstanceLock();
+  }
 
   if (m_checker->IsAnotherRunning()) {
     if (const NativeWindow window = TrovLookupWindow(kWindowName)) {
@@ -175,5 +187,10 @@ int main(int argc, char** argv) {
   // messages never reach the log target.
   wxSetAssertHandler(nullptr);
   wxLog::SetLogLevel(wxLOG_Info);
+  Phase("Start");
+  g_earlyLock = TakeInstanceLock();
+  // The catalogue's first search walks the documentation tree; as the
+  // running instance, have it walked while the toolkit starts.
+  if (!g_earlyLock->IsAnotherRunning()) TrovPrefetchSearch(kDocumentationCategory);
   return wxEntry(argc, argv);
 }

@@ -5,6 +5,7 @@
 #include <cstdlib>
 #include <cstring>
 #include <deque>
+#include <future>
 #include <memory>
 #include <set>
 #include <string>
@@ -100,10 +101,28 @@ std::unique_ptr<TreeIndex> BuildIndex(const std::string& root) {
   return index;
 }
 
+// Indexes being built ahead of their first search (TrovPrefetchSearch), by
+// root.  Guarded by the library mutex like Indexes(); the builders
+// themselves touch neither.
+std::unordered_map<std::string, std::future<std::unique_ptr<TreeIndex>>>& Pending() {
+  static std::unordered_map<std::string, std::future<std::unique_ptr<TreeIndex>>> pending;
+  return pending;
+}
+
 const TreeIndex& IndexOf(const std::string& root) {
   auto& indexes = Indexes();
   auto it = indexes.find(root);
-  if (it == indexes.end()) it = indexes.emplace(root, BuildIndex(root)).first;
+  if (it == indexes.end()) {
+    auto pending = Pending().find(root);
+    if (pending != Pending().end()) {
+      // Built ahead: wait for it rather than walk the tree a second time.
+      std::unique_ptr<TreeIndex> built = pending->second.get();
+      Pending().erase(pending);
+      it = indexes.emplace(root, std::move(built)).first;
+    } else {
+      it = indexes.emplace(root, BuildIndex(root)).first;
+    }
+  }
   return *it->second;
 }
 
@@ -232,7 +251,11 @@ std::vector<std::string> IconThemes() {
 
 }  // namespace
 
-void ResetSearchCaches() { Indexes().clear(); }
+void ResetSearchCaches() {
+  for (auto& pending : Pending()) pending.second.wait();
+  Pending().clear();
+  Indexes().clear();
+}
 
 }  // namespace trovlib
 
@@ -300,6 +323,20 @@ const char* TrovSearch(const char* spec, const char* name) {
     }
   }
   return nullptr;
+}
+
+void TrovPrefetchSearch(const char* spec) {
+  using namespace trovlib;
+  if (spec == nullptr) return;
+  std::lock_guard<std::mutex> lock(LibraryMutex());
+  std::vector<SearchRoot> roots;
+  AddPatternRoots(std::string(spec) == kDocumentationCategory ? "$TEXMF/doc//" : spec, roots);
+  for (const SearchRoot& root : roots) {
+    if (!root.recursive || Indexes().count(root.dir) || Pending().count(root.dir)) continue;
+    // std::async with the async policy: a thread of its own, joined by the
+    // first search that needs the index (or by a reset).
+    Pending().emplace(root.dir, std::async(std::launch::async, BuildIndex, root.dir));
+  }
 }
 
 void TrovResetCaches() {
