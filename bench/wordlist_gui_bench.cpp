@@ -41,6 +41,7 @@
 #include "catalogue/pool.h"
 #include "platform/profile.h"
 #include "test_support.h"
+#include "trovlib/prefetch.h"
 #include "trovlib/trovlib.h"
 #include "window/frame.h"
 #include "window/panel.h"

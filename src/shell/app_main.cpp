@@ -23,6 +23,7 @@
 #include "shell/app.h"
 #include "shell/log.h"
 #include "text/wxtext_gui.h"
+#include "trovlib/prefetch.h"
 #include "trovlib/trovlib.h"
 #include "window/frame.h"
 #include "window/panel.h"

@@ -16,6 +16,7 @@
 #include "platform/files.h"
 #include "platform/program_dir.h"
 #include "text/text.h"
+#include "trovlib/prefetch.h"
 #include "trovlib/trovlib.h"
 #include "trovlib/trovlib_internal.h"
 

@@ -41,12 +41,6 @@ void TrovMessage(const char* prefix, const char* text, int level);
 using TrovMessageSink = std::function<void(const char* prefix, const char* text, int level)>;
 void TrovSetMessageSink(TrovMessageSink sink);
 
-// Starts building the file-name index of every tree that `spec` (as for
-// TrovSearch) searches recursively, on threads of their own; the first
-// search of such a tree waits for its index instead of walking the tree.
-// Results are those of a search without it.
-void TrovPrefetchSearch(const char* spec);
-
 // Forgets every cached file-name index and variable lookup, so that a test
 // can change the environment or the trees and search again.
 void TrovResetCaches();
