@@ -190,8 +190,12 @@ int main(int argc, char** argv) {
   wxLog::SetLogLevel(wxLOG_Info);
   Phase("Start");
   g_earlyLock = TakeInstanceLock();
-  // The catalogue's first search walks the documentation tree; as the
-  // running instance, have it walked while the toolkit starts.
-  if (!g_earlyLock->IsAnotherRunning()) TrovPrefetchSearch(kDocumentationCategory);
+  // The catalogue's first search walks the documentation tree, the panel's
+  // first icon the icon trees; as the running instance, have them walked
+  // while the toolkit starts.
+  if (!g_earlyLock->IsAnotherRunning()) {
+    TrovPrefetchSearch(kDocumentationCategory);
+    TrovPrefetchSearch("Icon");
+  }
   return wxEntry(argc, argv);
 }

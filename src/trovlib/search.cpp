@@ -250,40 +250,16 @@ std::vector<std::string> IconThemes() {
   return SplitList(themes ? themes : kDefaultIconThemes);
 }
 
-}  // namespace
+// Each group of roots is searched with its own rules, in order.
+struct Group {
+  std::vector<SearchRoot> roots;
+  bool image_names;
+  bool rank_sizes;
+};
 
-void ResetSearchCaches() {
-  for (auto& pending : Pending()) pending.second.wait();
-  Pending().clear();
-  Indexes().clear();
-}
-
-}  // namespace trovlib
-
-const char* TrovSearch(const char* spec, const char* name) {
-  using namespace trovlib;
-  static std::string result;
-  if (spec == nullptr || name == nullptr) return nullptr;
-  std::string normal;
-  bool absolute = false;
-  if (!NormaliseName(name, normal, absolute)) return nullptr;
-
-  std::lock_guard<std::mutex> lock(LibraryMutex());
-  const std::string category(spec);
+// Where a search of `category` looks (the caller holds the library mutex).
+std::vector<Group> GroupsOf(const std::string& category) {
   const bool program = category == "Program";
-  if (absolute) {
-    std::string path = "/" + normal;
-    if (!IsRegularFile(path, program)) return nullptr;
-    result = path;
-    return result.c_str();
-  }
-
-  // Each group of roots is searched with its own rules, in order.
-  struct Group {
-    std::vector<SearchRoot> roots;
-    bool image_names;
-    bool rank_sizes;
-  };
   std::vector<Group> groups;
   if (category == kDocumentationCategory) {
     groups.push_back({{}, false, false});
@@ -313,6 +289,38 @@ const char* TrovSearch(const char* spec, const char* name) {
     AddPatternRoots(category, groups.back().roots);
   }
 
+  return groups;
+}
+
+}  // namespace
+
+void ResetSearchCaches() {
+  for (auto& pending : Pending()) pending.second.wait();
+  Pending().clear();
+  Indexes().clear();
+}
+
+}  // namespace trovlib
+
+const char* TrovSearch(const char* spec, const char* name) {
+  using namespace trovlib;
+  static std::string result;
+  if (spec == nullptr || name == nullptr) return nullptr;
+  std::string normal;
+  bool absolute = false;
+  if (!NormaliseName(name, normal, absolute)) return nullptr;
+
+  std::lock_guard<std::mutex> lock(LibraryMutex());
+  const std::string category(spec);
+  const bool program = category == "Program";
+  if (absolute) {
+    std::string path = "/" + normal;
+    if (!IsRegularFile(path, program)) return nullptr;
+    result = path;
+    return result.c_str();
+  }
+
+  const std::vector<Group> groups = GroupsOf(category);
   for (const auto& group : groups) {
     Searcher searcher(normal, group.image_names, program, group.rank_sizes);
     for (const auto& root : group.roots) {
@@ -330,13 +338,13 @@ void TrovPrefetchSearch(const char* spec) {
   using namespace trovlib;
   if (spec == nullptr) return;
   std::lock_guard<std::mutex> lock(LibraryMutex());
-  std::vector<SearchRoot> roots;
-  AddPatternRoots(std::string(spec) == kDocumentationCategory ? "$TEXMF/doc//" : spec, roots);
-  for (const SearchRoot& root : roots) {
-    if (!root.recursive || Indexes().count(root.dir) || Pending().count(root.dir)) continue;
-    // std::async with the async policy: a thread of its own, joined by the
-    // first search that needs the index (or by a reset).
-    Pending().emplace(root.dir, std::async(std::launch::async, BuildIndex, root.dir));
+  for (const Group& group : GroupsOf(spec)) {
+    for (const SearchRoot& root : group.roots) {
+      if (!root.recursive || Indexes().count(root.dir) || Pending().count(root.dir)) continue;
+      // std::async with the async policy: a thread of its own, joined by
+      // the first search that needs the index (or by a reset).
+      Pending().emplace(root.dir, std::async(std::launch::async, BuildIndex, root.dir));
+    }
   }
 }
 
