@@ -6,11 +6,13 @@
 #include <wx/log.h>
 #include <wx/utils.h>
 
+#include <clocale>
 #include <cstdint>
 #include <cstdio>
 #include <cstdlib>
 #include <memory>
 #include <string>
+#include <vector>
 
 #include "base/settings.h"
 #include "base/trace.h"
@@ -56,6 +58,42 @@ std::unique_ptr<InstanceLock> TakeInstanceLock() {
   return lock;
 }
 
+// A later start: raises the running instance's window, hands it the
+// command line and ends.  Needs neither the toolkit nor a display of its
+// own beyond the X11 connection that raising uses.
+[[noreturn]] void ForwardAndEnd(int argc, const wchar_t* const* argv) {
+  if (const NativeWindow window = TrovLookupWindow(kWindowName)) {
+    if (IsIconic(window)) OpenIcon(window);
+    BringWindowToTop(window);
+    SetForegroundWindow(window);
+  }
+  const char* const command = Command_Line(argc, argv);
+  unsigned status = kDeliveredStatus;
+  const std::string socketPath = CommandSocketPath();
+  if (socketPath.empty()) {
+    // The running instance cannot serve a channel here either; a second
+    // window would be a second instance.
+    TrovMessage("ERROR: MyApp::OnInit ",
+                (std::string("command channel off, command not delivered: ") + command).c_str(), 5);
+    status = kChannelOffStatus;
+  } else {
+    bool delivered = false;
+    SendCommand(command, socketPath, &delivered);
+    if (!delivered) {
+      TrovMessage(
+          "ERROR: MyApp::OnInit ",
+          (std::string("command not delivered to the running instance: ") + command).c_str(), 5);
+      status = kNotDeliveredStatus;
+    }
+  }
+  // The framework's own way out (OnInit returning false) would tear the
+  // toolkit down, and that teardown loads the toolkit's themes first: it
+  // would cost a later start more than all it has done.  The outcome is the
+  // same without it.
+  std::fflush(nullptr);
+  ExitProcess(status);
+}
+
 }  // namespace
 
 class MyApp : public wxApp {
@@ -87,39 +125,7 @@ bool MyApp::OnInit() {
     m_checker = TakeInstanceLock();
   }
 
-  if (m_checker->IsAnotherRunning()) {
-    if (const NativeWindow window = TrovLookupWindow(kWindowName)) {
-      if (IsIconic(window)) OpenIcon(window);
-      BringWindowToTop(window);
-      SetForegroundWindow(window);
-    }
-    const char* const command = Command_Line(argc, argv);
-    unsigned status = kDeliveredStatus;
-    const std::string socketPath = CommandSocketPath();
-    if (socketPath.empty()) {
-      // The running instance cannot serve a channel here either; a second
-      // window would be a second instance.
-      TrovMessage("ERROR: MyApp::OnInit ",
-                  (std::string("command channel off, command not delivered: ") + command).c_str(),
-                  5);
-      status = kChannelOffStatus;
-    } else {
-      bool delivered = false;
-      SendCommand(command, socketPath, &delivered);
-      if (!delivered) {
-        TrovMessage(
-            "ERROR: MyApp::OnInit ",
-            (std::string("command not delivered to the running instance: ") + command).c_str(), 5);
-        status = kNotDeliveredStatus;
-      }
-    }
-    // Returning false makes the framework end the process with its failure
-    // status (-1) after tearing the toolkit down, and that teardown loads
-    // the toolkit's themes first: it costs a later start more than all it
-    // has done so far.  The outcome is the same without it.
-    std::fflush(nullptr);
-    ExitProcess(status);
-  }
+  if (m_checker->IsAnotherRunning()) ForwardAndEnd(argc, argv);
 
   wxInitAllImageHandlers();
 
@@ -190,6 +196,17 @@ int main(int argc, char** argv) {
   wxLog::SetLogLevel(wxLOG_Info);
   Phase("Start");
   g_earlyLock = TakeInstanceLock();
+  if (g_earlyLock->IsAnotherRunning()) {
+    // The arguments as the framework would hand them over: wide strings in
+    // the user's locale, which the toolkit would have set by now.
+    std::setlocale(LC_ALL, "");
+    std::vector<wxWCharBuffer> wide;
+    std::vector<const wchar_t*> wideArgv;
+    for (int i = 0; i < argc; ++i) wide.push_back(wxString(argv[i], wxConvLocal).wc_str());
+    for (const wxWCharBuffer& arg : wide) wideArgv.push_back(arg.data());
+    wideArgv.push_back(nullptr);
+    ForwardAndEnd(argc, wideArgv.data());
+  }
   // The catalogue's first search walks the documentation tree, the panel's
   // first icon the icon trees; as the running instance, have them walked
   // while the toolkit starts.
