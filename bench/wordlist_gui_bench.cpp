@@ -294,6 +294,24 @@ BENCHMARK(BM_StartupToShownWindow)
     ->Iterations(1)
     ->Unit(benchmark::kMillisecond);
 
+// The same on the installed TeX trees and the index that
+// `docuvane-mkindex --scan` made of their documentation, with the default
+// trees: DOCUVANE_BENCH_SCANNED names the XDG_CACHE_HOME the scan ran with.
+void BM_StartupScannedInstallation(benchmark::State& state) {
+  const char* scanned = std::getenv("DOCUVANE_BENCH_SCANNED");
+  if (scanned == nullptr || !*scanned) {
+    state.SkipWithError("set DOCUVANE_BENCH_SCANNED to the XDG_CACHE_HOME of a scan");
+    return;
+  }
+  static testing_support::TempDir home;
+  unsetenv("TEXMF");
+  unsetenv("TEXDIR");
+  setenv("HOME", home.path().c_str(), 1);
+  setenv("XDG_CACHE_HOME", scanned, 1);
+  CompareStartups(state, home / "report");
+}
+BENCHMARK(BM_StartupScannedInstallation)->Iterations(1)->Unit(benchmark::kMillisecond);
+
 // ---------------------------------------------------------------------------
 // Keystroke to filled Locations list, in this process.
 
