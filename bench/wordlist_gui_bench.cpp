@@ -119,7 +119,12 @@ struct StartupTree {
     tex = root + "/tex";
     home = root + "/home";
     std::filesystem::create_directories(home);
-    if (kept && *kept && std::filesystem::exists(root + "/complete")) return;
+    if (!(kept && *kept && std::filesystem::exists(root + "/complete"))) Build(root);
+    // As every TeX tree has it: the file-name database, written last.
+    if (!std::filesystem::exists(tex + "/ls-R")) WriteLsR();
+  }
+
+  void Build(const std::string& root) {
     for (int i = 0; i < kFiles; ++i) Write("doc/" + FileName(i), "%PDF");
     std::string ini = "[Setup]\nTrace=0\n[DOC]\n";
     for (int i = 0; i < kListed; ++i) {
@@ -144,6 +149,22 @@ struct StartupTree {
     std::filesystem::create_directories(root + "/Update800k/Update");
     WriteBytes(root + "/Update800k/Update/command.Index", MakeIndex(labels, 4 * kWords));
     std::ofstream(root + "/complete") << "1\n";
+  }
+
+  // Every directory below the tree with its entries, as mktexlsr lists them.
+  void WriteLsR() {
+    namespace fs = std::filesystem;
+    std::string text = "% ls-R -- filename database for kpathsea; do not change this line.\n";
+    std::vector<fs::path> dirs = {fs::path(tex)};
+    for (const auto& entry : fs::recursive_directory_iterator(tex))
+      if (entry.is_directory()) dirs.push_back(entry.path());
+    for (const fs::path& dir : dirs) {
+      const std::string relative = fs::relative(dir, tex).string();
+      text += "\n" + (relative == "." ? std::string("./") : "./" + relative) + ":\n";
+      for (const auto& entry : fs::directory_iterator(dir))
+        text += entry.path().filename().string() + "\n";
+    }
+    std::ofstream(tex + "/ls-R") << text;
   }
   std::string TexDir(int words) const {
     return words > kWords ? tex.substr(0, tex.size() - 4) + "/Update800k" : tex;

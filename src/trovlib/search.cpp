@@ -16,6 +16,7 @@
 #include "platform/files.h"
 #include "platform/program_dir.h"
 #include "text/text.h"
+#include "trovlib/lsr.h"
 #include "trovlib/prefetch.h"
 #include "trovlib/trovlib.h"
 #include "trovlib/trovlib_internal.h"
@@ -71,8 +72,23 @@ std::string TrimDirectory(const std::string& text) {
   return dir;
 }
 
+void AddFile(TreeIndex& index, const std::string& name, std::string path) {
+  const std::string image = ImageName(name);
+  if (!image.empty()) index.by_image_name[image].push_back(path);
+  index.by_name[name].push_back(std::move(path));
+}
+
 std::unique_ptr<TreeIndex> BuildIndex(const std::string& root) {
   auto index = std::make_unique<TreeIndex>();
+  // The tree's own database when it is current, else a walk.
+  std::vector<std::string> listed;
+  if (ReadCurrentLsR(root, listed)) {
+    for (std::string& path : listed) {
+      const std::string name = path.substr(path.rfind('/') + 1);
+      AddFile(*index, name, std::move(path));
+    }
+    return index;
+  }
   std::set<std::pair<std::uint64_t, std::uint64_t>> visited;  // symbolic links may form loops
   std::deque<std::pair<std::string, int>> pending;
   pending.emplace_back(root, 0);
@@ -91,9 +107,7 @@ std::unique_ptr<TreeIndex> BuildIndex(const std::string& root) {
     for (const DirectoryEntry& entry : entries) {
       std::string path = JoinPath(dir, entry.name);
       if (entry.regular) {
-        const std::string image = ImageName(entry.name);
-        if (!image.empty()) index->by_image_name[image].push_back(path);
-        index->by_name[entry.name].push_back(std::move(path));
+        AddFile(*index, entry.name, std::move(path));
       } else if (entry.directory && depth < kMaxTreeDepth) {
         pending.emplace_back(std::move(path), depth + 1);
       }
