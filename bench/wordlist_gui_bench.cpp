@@ -31,6 +31,7 @@
 #include <cstdlib>
 #include <cstring>
 #include <fstream>
+#include <memory>
 #include <string>
 #include <thread>
 #include <vector>
@@ -339,13 +340,14 @@ BENCHMARK(BM_StartupScannedInstallation)->Iterations(1)->Unit(benchmark::kMillis
 struct KeystrokeWindow {
   testing_support::TempDir dir;
   MyFrame* frame = nullptr;
+  int words;
   std::vector<std::string> typed;  // every prefix of a sample of words, in typing order
 
-  KeystrokeWindow() {
+  explicit KeystrokeWindow(int wordCount) : words(wordCount) {
     std::vector<std::string> labels;
     for (int i = 0; i < kDocuments; ++i) labels.push_back("latex/" + FileName(i));
     const std::string index = dir / "command.Index";
-    WriteBytes(index, MakeIndex(labels));
+    WriteBytes(index, MakeIndex(labels, words));
     IniFilePath = dir.Write("Docuvane.ini", "[Setup]\n");
     setenv("HOME", dir.path().c_str(), 1);
     setenv("TEXMF", dir.path().c_str(), 1);
@@ -362,10 +364,21 @@ struct KeystrokeWindow {
       for (std::size_t n = 1; n <= word.size(); ++n) typed.push_back(word.substr(0, n));
     }
   }
+  ~KeystrokeWindow() {
+    frame->Destroy();
+    wxYield();
+  }
 };
 
 void BM_KeystrokeToLocations(benchmark::State& state) {
-  static KeystrokeWindow window;
+  // One window at a time: the word index is the process's.
+  static std::unique_ptr<KeystrokeWindow> current;
+  const int words = static_cast<int>(state.range(0));
+  if (!current || current->words != words) {
+    current.reset();
+    current.reset(new KeystrokeWindow(words));
+  }
+  KeystrokeWindow& window = *current;
   Docuvane* panel = window.frame->m_helpPanel;
   if (DocumentCount != kDocuments) state.SkipWithError("catalogue incomplete");
   std::vector<double> each;
@@ -387,7 +400,11 @@ void BM_KeystrokeToLocations(benchmark::State& state) {
   state.counters["words"] = static_cast<double>(panel->m_wordList->GetItemCount());
   state.counters["labels"] = LabelCount;
 }
-BENCHMARK(BM_KeystrokeToLocations)->Iterations(2000)->Unit(benchmark::kMicrosecond);
+BENCHMARK(BM_KeystrokeToLocations)
+    ->Arg(kWords)
+    ->Arg(4 * kWords)
+    ->Iterations(2000)
+    ->Unit(benchmark::kMicrosecond);
 
 class BenchApp : public wxApp {
  public:
