@@ -276,7 +276,7 @@ void CompareStartups(benchmark::State& state, const std::string& reportFile) {
   // start runs interleaved with ours: before and after in one run.
   const char* baselineEnv = std::getenv("DOCUVANE_BENCH_BASELINE");
   const std::string baseline = baselineEnv ? baselineEnv : "";
-  std::vector<double> empty, docuvane, emptyPeak, docuvanePeak, before;
+  std::vector<double> empty, docuvane, emptyPeak, docuvanePeak, before, beforePeak;
   for (auto _ : state) {
     for (int round = 0; round < 9; ++round) {
       double peak = 0;
@@ -284,7 +284,10 @@ void CompareStartups(benchmark::State& state, const std::string& reportFile) {
       emptyPeak.push_back(peak);
       docuvane.push_back(RunProcess("--child=docuvane", &peak));
       docuvanePeak.push_back(peak);
-      if (!baseline.empty()) before.push_back(RunProcess("--child=docuvane", nullptr, baseline));
+      if (!baseline.empty()) {
+        before.push_back(RunProcess("--child=docuvane", &peak, baseline));
+        beforePeak.push_back(peak);
+      }
     }
   }
   if (std::count(empty.begin(), empty.end(), -1.0) ||
@@ -298,6 +301,7 @@ void CompareStartups(benchmark::State& state, const std::string& reportFile) {
   if (!before.empty()) {
     state.counters["baseline_ms"] = Median(before);
     state.counters["baseline_ratio"] = Median(before) / Median(empty);
+    state.counters["baseline_peak_MiB"] = Median(beforePeak);
   }
 }
 
