@@ -3,7 +3,8 @@
 #include <algorithm>
 #include <cstdint>
 #include <cstring>
-#include <unordered_set>
+#include <string_view>
+#include <unordered_map>
 
 #include "platform/change_time.h"
 #include "platform/files.h"
@@ -80,48 +81,85 @@ bool ReadCurrentLsR(const std::string& root, std::vector<std::string>& files) {
             dir[below.size()] == '/');
   };
 
-  // Entries of every section inside root; a name that has a section of its
-  // own is a directory, every other name a file.
-  std::vector<std::pair<std::string, std::string>> entries;  // directory, name
-  std::unordered_set<std::string> directories;
-  std::string current;
-  bool inside = false;
+  // The sections inside root, each with its entries; a name that has a
+  // section of its own is a directory, every other name a file.
+  struct Section {
+    std::string dir;
+    std::vector<std::string_view> names;
+    std::vector<std::string_view> subdirectories;  // names with a section of their own
+  };
+  std::vector<Section> sections;
+  std::unordered_map<std::string, std::size_t> byDirectory;
+  Section* current = nullptr;
   std::size_t at = firstEnd == std::string::npos ? text.size() : firstEnd + 1;
   while (at < text.size()) {
     std::size_t end = text.find('\n', at);
     if (end == std::string::npos) end = text.size();
-    std::string line = text.substr(at, end - at);
+    std::string_view line(text.data() + at, end - at);
     at = end + 1;
-    if (!line.empty() && line.back() == '\r') line.pop_back();
+    if (!line.empty() && line.back() == '\r') line.remove_suffix(1);
     if (line.empty() || line[0] == '%') continue;
     if (line.back() == ':' && (line[0] == '.' || line[0] == '/')) {
       if (line[0] == '/') return false;  // written for another place
-      current = SectionDirectory(line);
-      inside = inRoot(current);
-      if (inside) directories.insert(current);
+      const std::string dir = SectionDirectory(std::string(line));
+      current = nullptr;
+      if (!inRoot(dir)) continue;
+      auto found = byDirectory.find(dir);
+      if (found == byDirectory.end()) {
+        found = byDirectory.emplace(dir, sections.size()).first;
+        sections.push_back(Section{dir, {}, {}});
+      }
+      current = &sections[found->second];
       continue;
     }
-    if (!inside || line == "." || line == "..") continue;
-    entries.emplace_back(current, line);
+    if (current == nullptr || line == "." || line == "..") continue;
+    current->names.push_back(line);
   }
-  if (!directories.count(below)) return false;
+  if (!byDirectory.count(below)) return false;
 
   // Current: nothing below root has changed since the database was written.
-  for (const std::string& dir : directories) {
+  for (const Section& section : sections) {
     std::int64_t changed = 0;
-    if (!ChangeTimeOf(dir.empty() ? top : top + "/" + dir, changed)) return false;
+    if (!ChangeTimeOf(section.dir.empty() ? top : top + "/" + section.dir, changed)) return false;
     // A change in the same clock tick as the database may have come after it.
     if (changed >= database.mtimeNs) return false;
   }
 
-  for (const auto& entry : entries) {
-    const std::string relative =
-        entry.first.empty() ? entry.second : entry.first + "/" + entry.second;
-    if (directories.count(relative)) continue;
-    files.push_back(relative);
+  for (const Section& section : sections) {
+    if (section.dir == below) continue;
+    const std::size_t slash = section.dir.rfind('/');
+    const std::string parent =
+        slash == std::string::npos ? std::string() : section.dir.substr(0, slash);
+    auto found = byDirectory.find(parent);
+    if (found == byDirectory.end()) continue;
+    const std::string& dir = section.dir;
+    sections[found->second].subdirectories.push_back(slash == std::string::npos
+                                                         ? std::string_view(dir)
+                                                         : std::string_view(dir).substr(slash + 1));
   }
-  std::sort(files.begin(), files.end(), WalkOrder);
-  for (std::string& file : files) file = top + "/" + file;
+
+  // The walk's order: directory by directory, shallower first and then by
+  // the steps' byte order, each directory's names in byte order.
+  std::vector<const Section*> order;
+  order.reserve(sections.size());
+  for (const Section& section : sections) order.push_back(&section);
+  std::sort(order.begin(), order.end(),
+            [](const Section* a, const Section* b) { return WalkOrder(a->dir, b->dir); });
+  std::string path;
+  for (const Section* section : order) {
+    std::vector<std::string_view> names = section->names;
+    std::vector<std::string_view> subdirectories = section->subdirectories;
+    std::sort(names.begin(), names.end());
+    std::sort(subdirectories.begin(), subdirectories.end());
+    const std::string prefix = section->dir.empty() ? top + "/" : top + "/" + section->dir + "/";
+    auto subdirectory = subdirectories.begin();
+    for (std::string_view name : names) {
+      while (subdirectory != subdirectories.end() && *subdirectory < name) ++subdirectory;
+      if (subdirectory != subdirectories.end() && *subdirectory == name) continue;
+      path.assign(prefix).append(name);
+      files.push_back(path);
+    }
+  }
   return true;
 }
 
