@@ -16,10 +16,11 @@ namespace trovlib {
 // False, and the tree must be walked, when there is no such ls-R, when its
 // first line is not the database's, when it does not list `root` itself,
 // or when it is not current: it is current when every directory it lists
-// below `root` still exists and every one changed last before the ls-R
-// was written, not even in the same clock tick (a directory's change time moves whenever an entry is added,
-// removed or renamed in it, so a file added anywhere is caught at its
-// directory or, for a new directory, at the listed directory above it).
+// below `root` still exists and last changed before the ls-R was written,
+// not in the same clock tick (a directory's status change time moves
+// whenever an entry is added, removed or renamed in it, and cannot be set
+// back, so a file added anywhere is caught at its directory or, for a new
+// directory, at the listed directory above it).
 bool ReadCurrentLsR(const std::string& root, std::vector<std::string>& files);
 
 }  // namespace trovlib
