@@ -1,12 +1,18 @@
 // The window on large data:
 //  - start-up to the shown window on a TeX tree of 50,000 files and 8,190
-//    documents, against the floor of a process of the same binary that only
-//    shows an empty frame and exits (both timed as whole processes);
+//    documents, with 200,000 and 800,000 index words, against the floor of a
+//    process of the same binary that only shows an empty frame and exits
+//    (both timed as whole processes, with their peak resident memory);
+//    DOCUVANE_BENCH_TREE=<dir> keeps the tree there between runs, and
+//    `--child=docuvane` with TEXMF and TEXDIR set runs one start by itself
+//    (for a profiler);
 //  - a keystroke in the search field to the filled Locations list (OnSearch:
 //    FindWordInList and Show_Topic) on a word index of 200,000 words and
 //    8,190 labels.
 // Needs a display: run it under tests/run-with-display.sh.
 #include <benchmark/benchmark.h>
+#include <spawn.h>
+#include <sys/stat.h>
 #include <sys/wait.h>
 #include <unistd.h>
 #include <wx/app.h>
@@ -25,22 +31,24 @@
 #include <cstdlib>
 #include <cstring>
 #include <fstream>
+#include <memory>
 #include <string>
 #include <thread>
 #include <vector>
 
+#include "base/settings.h"
 #include "catalogue/documents.h"
 #include "catalogue/keywords.h"
 #include "catalogue/pool.h"
 #include "platform/profile.h"
-#include "base/settings.h"
-#include "wordindex/locate.h"
 #include "test_support.h"
+#include "trovlib/prefetch.h"
 #include "trovlib/trovlib.h"
 #include "window/frame.h"
 #include "window/panel.h"
-#include "wordindex/index_writer.h"
 #include "window/qlistbox.h"
+#include "wordindex/index_writer.h"
+#include "wordindex/locate.h"
 #include "wordindex/wordindex.h"
 
 namespace {
@@ -67,15 +75,17 @@ uint64_t Next(uint64_t& state) {
 }
 
 // 200,000 commands, environments and plain words over `labels`.
-std::vector<uint8_t> MakeIndex(const std::vector<std::string>& labels) {
+std::vector<uint8_t> MakeIndex(const std::vector<std::string>& labels, int words = kWords) {
   uint64_t state = 0x9E3779B97F4A7C15ull;
   WordIndexBuilder builder;
   std::string error;
-  while (builder.WordCount() < static_cast<std::size_t>(kWords)) {
+  while (builder.WordCount() < static_cast<std::size_t>(words)) {
     std::string word;
     const uint64_t kind = Next(state) % 10;
-    if (kind < 6) word = "\\";
-    else if (kind < 8) word = "{";
+    if (kind < 6)
+      word = "\\";
+    else if (kind < 8)
+      word = "{";
     const int length = 3 + static_cast<int>(Next(state) % 14);
     for (int i = 0; i < length; ++i) word += static_cast<char>('a' + Next(state) % 26);
     if (kind >= 6 && kind < 8) word += "}";
@@ -94,15 +104,29 @@ std::vector<uint8_t> MakeIndex(const std::vector<std::string>& labels) {
 
 void WriteBytes(const std::string& path, const std::vector<uint8_t>& bytes) {
   std::ofstream(path, std::ios::binary)
-      .write(reinterpret_cast<const char*>(bytes.data()), static_cast<std::streamsize>(bytes.size()));
+      .write(reinterpret_cast<const char*>(bytes.data()),
+             static_cast<std::streamsize>(bytes.size()));
 }
 
 // The start-up tree: 50,000 files, 2,000 [DOC] documents (one in eight with
-// a definition file), an index of 200,000 words over 6,190 labels.
+// a definition file), an index of 200,000 words over 6,190 labels in
+// Update/, one of 800,000 words in Update800k/Update/ (TEXDIR picks it).
 struct StartupTree {
-  testing_support::TempDir tex, home;
+  testing_support::TempDir scratch;
+  std::string tex, home;
   StartupTree() {
-    for (int i = 0; i < kFiles; ++i) tex.Write("doc/" + FileName(i), "%PDF");
+    const char* kept = std::getenv("DOCUVANE_BENCH_TREE");
+    const std::string root = kept && *kept ? kept : scratch.path();
+    tex = root + "/tex";
+    home = root + "/home";
+    std::filesystem::create_directories(home);
+    if (!(kept && *kept && std::filesystem::exists(root + "/complete"))) Build(root);
+    // As every TeX tree has it: the file-name database, written last.
+    if (!std::filesystem::exists(tex + "/ls-R")) WriteLsR();
+  }
+
+  void Build(const std::string& root) {
+    for (int i = 0; i < kFiles; ++i) Write("doc/" + FileName(i), "%PDF");
     std::string ini = "[Setup]\nTrace=0\n[DOC]\n";
     for (int i = 0; i < kListed; ++i) {
       char key[96];
@@ -111,17 +135,47 @@ struct StartupTree {
       if (i % 8 == 0) {
         std::string ddf = "[Keywords]\n";
         for (int k = 0; k < 20; ++k)
-          ddf += "#5Cword" + std::to_string((i * 7 + k * 101) % 2000) + "=anchor" + std::to_string(k) + "\n";
+          ddf += "#5Cword" + std::to_string((i * 7 + k * 101) % 2000) + "=anchor" +
+                 std::to_string(k) + "\n";
         std::string name = FileName(i);
         name.replace(name.size() - 4, 4, ".ddf");
-        tex.Write("doc/" + name, ddf);
+        Write("doc/" + name, ddf);
       }
     }
-    tex.Write("Docuvane/Docuvane.ini", ini);
+    Write("Docuvane/Docuvane.ini", ini);
     std::vector<std::string> labels;
     for (int i = kListed; i < kDocuments; ++i) labels.push_back("latex/" + FileName(i));
-    std::filesystem::create_directories(tex / "Update");
-    WriteBytes(tex / "Update/command.Index", MakeIndex(labels));
+    std::filesystem::create_directories(tex + "/Update");
+    WriteBytes(tex + "/Update/command.Index", MakeIndex(labels));
+    std::filesystem::create_directories(root + "/Update800k/Update");
+    WriteBytes(root + "/Update800k/Update/command.Index", MakeIndex(labels, 4 * kWords));
+    std::ofstream(root + "/complete") << "1\n";
+  }
+
+  // Every directory below the tree with its entries, as mktexlsr lists them.
+  void WriteLsR() {
+    namespace fs = std::filesystem;
+    std::string text = "% ls-R -- filename database for kpathsea; do not change this line.\n";
+    std::vector<fs::path> dirs = {fs::path(tex)};
+    for (const auto& entry : fs::recursive_directory_iterator(tex))
+      if (entry.is_directory()) dirs.push_back(entry.path());
+    for (const fs::path& dir : dirs) {
+      const std::string relative = fs::relative(dir, tex).string();
+      text += "\n" + (relative == "." ? std::string("./") : "./" + relative) + ":\n";
+      for (const auto& entry : fs::directory_iterator(dir))
+        text += entry.path().filename().string() + "\n";
+    }
+    std::ofstream(tex + "/ls-R") << text;
+  }
+  std::string TexDir(int words) const {
+    return words > kWords ? tex.substr(0, tex.size() - 4) + "/Update800k" : tex;
+  }
+
+ private:
+  void Write(const std::string& rel, const std::string& content) {
+    std::filesystem::path p = std::filesystem::path(tex) / rel;
+    std::filesystem::create_directories(p.parent_path());
+    std::ofstream(p, std::ios::binary) << content;
   }
 };
 
@@ -129,6 +183,11 @@ struct StartupTree {
 // Child processes for the start-up comparison.
 
 int RunChild(int argc, char** argv, bool docuvane) {
+  // As the program's main does before the toolkit starts.
+  if (docuvane) {
+    TrovPrefetchSearch(kDocumentationCategory);
+    TrovPrefetchSearch("Icon");
+  }
   if (!wxEntryStart(argc, argv)) return 2;
   wxTheApp->CallOnInit();
   wxLog::EnableLogging(false);
@@ -150,6 +209,20 @@ int RunChild(int argc, char** argv, bool docuvane) {
     std::this_thread::sleep_for(std::chrono::milliseconds(1));
   }
   wxYield();  // the first paint
+  // For the parent: when the window stood (the clock is the system's
+  // monotonic one, the same in both processes), and the peak resident
+  // memory so far (rusage would count the parent's pages shared before
+  // exec).  What the process does after that is not start-up.
+  if (const char* reportFile = std::getenv("DOCUVANE_BENCH_REPORT_FILE")) {
+    const auto shown =
+        std::chrono::duration_cast<std::chrono::nanoseconds>(Clock::now().time_since_epoch())
+            .count();
+    std::ifstream status("/proc/self/status");
+    std::string line, peak = "0";
+    while (std::getline(status, line))
+      if (line.rfind("VmHWM:", 0) == 0) peak = line.substr(6);
+    std::ofstream(reportFile) << shown << " " << peak << "\n";
+  }
   delete frame;
   delete wxConfigBase::Set(nullptr);
   wxEntryCleanup();
@@ -164,18 +237,29 @@ std::string SelfPath() {
   return buffer;
 }
 
-double RunProcess(const std::string& mode) {
+// Time from spawning one child to its shown window in ms (-1 when it
+// failed), and its peak resident memory up to then in MiB.
+double RunProcess(const std::string& mode, double* peakMiB = nullptr,
+                  const std::string& binary = std::string()) {
   const auto start = Clock::now();
-  const pid_t pid = fork();
-  if (pid == 0) {
-    const std::string self = SelfPath();
-    execl(self.c_str(), self.c_str(), mode.c_str(), static_cast<char*>(nullptr));
-    _exit(127);
-  }
+  // Spawned, not forked: a forked child would start with this process's
+  // resident pages and report them as its peak.
+  const std::string self = binary.empty() ? SelfPath() : binary;
+  char* const args[] = {const_cast<char*>(self.c_str()), const_cast<char*>(mode.c_str()), nullptr};
+  pid_t pid = 0;
+  if (posix_spawn(&pid, self.c_str(), nullptr, nullptr, args, environ) != 0) return -1;
   int status = 0;
   waitpid(pid, &status, 0);
-  const double ms = std::chrono::duration<double, std::milli>(Clock::now() - start).count();
-  return WIFEXITED(status) && WEXITSTATUS(status) == 0 ? ms : -1;
+  std::ifstream in(std::getenv("DOCUVANE_BENCH_REPORT_FILE"));
+  long long shownNs = 0;
+  double kib = 0;
+  in >> shownNs >> kib;
+  if (peakMiB) *peakMiB = kib / 1024.0;
+  const double ms = std::chrono::duration<double, std::milli>(
+                        Clock::time_point(std::chrono::nanoseconds(shownNs)) - start)
+                        .count();
+  std::remove(std::getenv("DOCUVANE_BENCH_REPORT_FILE"));
+  return WIFEXITED(status) && WEXITSTATUS(status) == 0 && shownNs > 0 ? ms : -1;
 }
 
 double Median(std::vector<double> v) {
@@ -183,28 +267,76 @@ double Median(std::vector<double> v) {
   return v.empty() ? 0 : v[v.size() / 2];
 }
 
-void BM_StartupToShownWindow(benchmark::State& state) {
-  static StartupTree tree;
-  setenv("TEXMF", tree.tex.path().c_str(), 1);
-  setenv("HOME", tree.home.path().c_str(), 1);
-  setenv("XDG_CACHE_HOME", (tree.home / "cache").c_str(), 1);
+// Starts of the empty frame and of the program, interleaved so that both
+// see the same machine load, with the environment already set.
+void CompareStartups(benchmark::State& state, const std::string& reportFile) {
   setenv("TROVLIB_STDERR_LEVEL", "9", 1);
-  unsetenv("TEXDIR");
-  std::vector<double> empty, docuvane;
+  setenv("DOCUVANE_BENCH_REPORT_FILE", reportFile.c_str(), 1);
+  // DOCUVANE_BENCH_BASELINE names an earlier build of this benchmark, whose
+  // start runs interleaved with ours: before and after in one run.
+  const char* baselineEnv = std::getenv("DOCUVANE_BENCH_BASELINE");
+  const std::string baseline = baselineEnv ? baselineEnv : "";
+  std::vector<double> empty, docuvane, emptyPeak, docuvanePeak, before, beforePeak;
   for (auto _ : state) {
-    for (int round = 0; round < 7; ++round) {
-      // Interleaved, so both see the same machine load.
-      empty.push_back(RunProcess("--child=empty"));
-      docuvane.push_back(RunProcess("--child=docuvane"));
+    for (int round = 0; round < 9; ++round) {
+      double peak = 0;
+      empty.push_back(RunProcess("--child=empty", &peak));
+      emptyPeak.push_back(peak);
+      docuvane.push_back(RunProcess("--child=docuvane", &peak));
+      docuvanePeak.push_back(peak);
+      if (!baseline.empty()) {
+        before.push_back(RunProcess("--child=docuvane", &peak, baseline));
+        beforePeak.push_back(peak);
+      }
     }
   }
-  if (std::count(empty.begin(), empty.end(), -1.0) || std::count(docuvane.begin(), docuvane.end(), -1.0))
+  if (std::count(empty.begin(), empty.end(), -1.0) ||
+      std::count(docuvane.begin(), docuvane.end(), -1.0))
     state.SkipWithError("a child process failed (no display?)");
   state.counters["empty_frame_ms"] = Median(empty);
   state.counters["docuvane_ms"] = Median(docuvane);
   state.counters["ratio"] = Median(docuvane) / Median(empty);
+  state.counters["empty_peak_MiB"] = Median(emptyPeak);
+  state.counters["docuvane_peak_MiB"] = Median(docuvanePeak);
+  if (!before.empty()) {
+    state.counters["baseline_ms"] = Median(before);
+    state.counters["baseline_ratio"] = Median(before) / Median(empty);
+    state.counters["baseline_peak_MiB"] = Median(beforePeak);
+  }
 }
-BENCHMARK(BM_StartupToShownWindow)->Iterations(1)->Unit(benchmark::kMillisecond);
+
+void BM_StartupToShownWindow(benchmark::State& state) {
+  static StartupTree tree;
+  const int words = static_cast<int>(state.range(0));
+  setenv("TEXMF", tree.tex.c_str(), 1);
+  setenv("TEXDIR", tree.TexDir(words).c_str(), 1);
+  setenv("HOME", tree.home.c_str(), 1);
+  setenv("XDG_CACHE_HOME", (tree.home + "/cache").c_str(), 1);
+  CompareStartups(state, tree.home + "/report");
+}
+BENCHMARK(BM_StartupToShownWindow)
+    ->Arg(kWords)
+    ->Arg(4 * kWords)
+    ->Iterations(1)
+    ->Unit(benchmark::kMillisecond);
+
+// The same on the installed TeX trees and the index that
+// `docuvane-mkindex --scan` made of their documentation, with the default
+// trees: DOCUVANE_BENCH_SCANNED names the XDG_CACHE_HOME the scan ran with.
+void BM_StartupScannedInstallation(benchmark::State& state) {
+  const char* scanned = std::getenv("DOCUVANE_BENCH_SCANNED");
+  if (scanned == nullptr || !*scanned) {
+    state.SkipWithError("set DOCUVANE_BENCH_SCANNED to the XDG_CACHE_HOME of a scan");
+    return;
+  }
+  static testing_support::TempDir home;
+  unsetenv("TEXMF");
+  unsetenv("TEXDIR");
+  setenv("HOME", home.path().c_str(), 1);
+  setenv("XDG_CACHE_HOME", scanned, 1);
+  CompareStartups(state, home / "report");
+}
+BENCHMARK(BM_StartupScannedInstallation)->Iterations(1)->Unit(benchmark::kMillisecond);
 
 // ---------------------------------------------------------------------------
 // Keystroke to filled Locations list, in this process.
@@ -212,13 +344,14 @@ BENCHMARK(BM_StartupToShownWindow)->Iterations(1)->Unit(benchmark::kMillisecond)
 struct KeystrokeWindow {
   testing_support::TempDir dir;
   MyFrame* frame = nullptr;
+  int words;
   std::vector<std::string> typed;  // every prefix of a sample of words, in typing order
 
-  KeystrokeWindow() {
+  explicit KeystrokeWindow(int wordCount) : words(wordCount) {
     std::vector<std::string> labels;
     for (int i = 0; i < kDocuments; ++i) labels.push_back("latex/" + FileName(i));
     const std::string index = dir / "command.Index";
-    WriteBytes(index, MakeIndex(labels));
+    WriteBytes(index, MakeIndex(labels, words));
     IniFilePath = dir.Write("Docuvane.ini", "[Setup]\n");
     setenv("HOME", dir.path().c_str(), 1);
     setenv("TEXMF", dir.path().c_str(), 1);
@@ -235,10 +368,21 @@ struct KeystrokeWindow {
       for (std::size_t n = 1; n <= word.size(); ++n) typed.push_back(word.substr(0, n));
     }
   }
+  ~KeystrokeWindow() {
+    frame->Destroy();
+    wxYield();
+  }
 };
 
 void BM_KeystrokeToLocations(benchmark::State& state) {
-  static KeystrokeWindow window;
+  // One window at a time: the word index is the process's.
+  static std::unique_ptr<KeystrokeWindow> current;
+  const int words = static_cast<int>(state.range(0));
+  if (!current || current->words != words) {
+    current.reset();
+    current.reset(new KeystrokeWindow(words));
+  }
+  KeystrokeWindow& window = *current;
   Docuvane* panel = window.frame->m_helpPanel;
   if (DocumentCount != kDocuments) state.SkipWithError("catalogue incomplete");
   std::vector<double> each;
@@ -260,7 +404,11 @@ void BM_KeystrokeToLocations(benchmark::State& state) {
   state.counters["words"] = static_cast<double>(panel->m_wordList->GetItemCount());
   state.counters["labels"] = LabelCount;
 }
-BENCHMARK(BM_KeystrokeToLocations)->Iterations(2000)->Unit(benchmark::kMicrosecond);
+BENCHMARK(BM_KeystrokeToLocations)
+    ->Arg(kWords)
+    ->Arg(4 * kWords)
+    ->Iterations(2000)
+    ->Unit(benchmark::kMicrosecond);
 
 class BenchApp : public wxApp {
  public:
@@ -276,7 +424,8 @@ int main(int argc, char** argv) {
   if (argc == 2 && std::strcmp(argv[1], "--child=docuvane") == 0) return RunChild(argc, argv, true);
   benchmark::Initialize(&argc, argv);
   if (!wxEntryStart(argc, argv)) {
-    std::fprintf(stderr, "wordlist_gui_bench: no display; run it under tests/run-with-display.sh\n");
+    std::fprintf(stderr,
+                 "wordlist_gui_bench: no display; run it under tests/run-with-display.sh\n");
     return 1;
   }
   wxTheApp->CallOnInit();

@@ -2,6 +2,7 @@
 // then one entry for every label of the word index.
 #include "catalogue/documents.h"
 
+#include <algorithm>
 #include <cstdint>
 #include <cstring>
 #include <memory>
@@ -10,12 +11,12 @@
 #include <unordered_map>
 #include <vector>
 
+#include "base/settings.h"
+#include "base/trace.h"
 #include "catalogue/keywords.h"
 #include "platform/files.h"
 #include "platform/profile.h"
 #include "text/text.h"
-#include "base/settings.h"
-#include "base/trace.h"
 #include "trovlib/trovlib.h"
 #include "wordindex/wordindex.h"
 
@@ -41,7 +42,7 @@ class DocumentLookup {
  public:
   void Clear() {
     first_by_name_language_.clear();
-    last_by_name_.clear();
+    by_name_.clear();
     indexed_ = 0;
   }
 
@@ -63,13 +64,20 @@ class DocumentLookup {
   // Index of the last entry before `before` with this name, or -1.
   int FindLastByName(const std::string& name, int before) {
     Sync();
-    auto it = last_by_name_.find(Folded(name));
-    if (it == last_by_name_.end() || it->second >= before) {
+    auto it = by_name_.find(Folded(name));
+    if (it == by_name_.end()) return -1;
+    // The entries of one name, in table order: the last one below `before`.
+    const std::vector<int>& indexes = it->second;
+    auto below = std::lower_bound(indexes.begin(), indexes.end(), before);
+    if (below == indexes.begin()) return -1;
+    const int found = *(below - 1);
+    if (CompareIgnoringCase(DocumentTable[found].Name.c_str(), name.c_str()) != 0) {
+      // The table was changed behind our back.
       for (int i = before - 1; i >= 0; --i)
         if (CompareIgnoringCase(DocumentTable[i].Name.c_str(), name.c_str()) == 0) return i;
       return -1;
     }
-    return it->second;
+    return found;
   }
 
  private:
@@ -78,7 +86,7 @@ class DocumentLookup {
     for (; indexed_ < DocumentCount; ++indexed_) {
       const DocumentEntry& entry = DocumentTable[indexed_];
       first_by_name_language_.emplace(NameLanguageKey(entry.Name, entry.Language), indexed_);
-      last_by_name_[Folded(entry.Name)] = indexed_;
+      by_name_[Folded(entry.Name)].push_back(indexed_);
     }
   }
 
@@ -91,7 +99,7 @@ class DocumentLookup {
   }
 
   std::unordered_map<std::string, int> first_by_name_language_;
-  std::unordered_map<std::string, int> last_by_name_;
+  std::unordered_map<std::string, std::vector<int>> by_name_;
   int indexed_ = 0;
 };
 

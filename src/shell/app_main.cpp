@@ -6,11 +6,13 @@
 #include <wx/log.h>
 #include <wx/utils.h>
 
+#include <clocale>
 #include <cstdint>
 #include <cstdio>
 #include <cstdlib>
 #include <memory>
 #include <string>
+#include <vector>
 
 #include "base/settings.h"
 #include "base/trace.h"
@@ -23,6 +25,7 @@
 #include "shell/app.h"
 #include "shell/log.h"
 #include "text/wxtext_gui.h"
+#include "trovlib/prefetch.h"
 #include "trovlib/trovlib.h"
 #include "window/frame.h"
 #include "window/panel.h"
@@ -39,6 +42,57 @@ constexpr unsigned kNotDeliveredStatus = 1;
 constexpr unsigned kChannelOffStatus = 2;
 
 void Phase(const char* phase) { TraceMessage("Docuvane::OnInit --- ", phase); }
+
+// The instance lock, taken in main before the toolkit starts: the running
+// instance can then set work going that needs no toolkit while the toolkit
+// loads.  OnInit takes it over.
+std::unique_ptr<InstanceLock> g_earlyLock;
+
+std::unique_ptr<InstanceLock> TakeInstanceLock() {
+  const std::string user = wxGetUserId().ToStdString();
+  char lockName[256];
+  std::snprintf(lockName, sizeof lockName, "Lomari-Docuvane-%s", user.c_str());
+  std::unique_ptr<InstanceLock> lock(new InstanceLock);
+  lock->Create(lockName);
+  if (!lock->error().empty()) TrovMessage("ERROR: InstanceLock ", lock->error().c_str(), 5);
+  return lock;
+}
+
+// A later start: raises the running instance's window, hands it the
+// command line and ends.  Needs neither the toolkit nor a display of its
+// own beyond the X11 connection that raising uses.
+[[noreturn]] void ForwardAndEnd(int argc, const wchar_t* const* argv) {
+  if (const NativeWindow window = TrovLookupWindow(kWindowName)) {
+    if (IsIconic(window)) OpenIcon(window);
+    BringWindowToTop(window);
+    SetForegroundWindow(window);
+  }
+  const char* const command = Command_Line(argc, argv);
+  unsigned status = kDeliveredStatus;
+  const std::string socketPath = CommandSocketPath();
+  if (socketPath.empty()) {
+    // The running instance cannot serve a channel here either; a second
+    // window would be a second instance.
+    TrovMessage("ERROR: MyApp::OnInit ",
+                (std::string("command channel off, command not delivered: ") + command).c_str(), 5);
+    status = kChannelOffStatus;
+  } else {
+    bool delivered = false;
+    SendCommand(command, socketPath, &delivered);
+    if (!delivered) {
+      TrovMessage(
+          "ERROR: MyApp::OnInit ",
+          (std::string("command not delivered to the running instance: ") + command).c_str(), 5);
+      status = kNotDeliveredStatus;
+    }
+  }
+  // The framework's own way out (OnInit returning false) would tear the
+  // toolkit down, and that teardown loads the toolkit's themes first: it
+  // would cost a later start more than all it has done.  The outcome is the
+  // same without it.
+  std::fflush(nullptr);
+  ExitProcess(status);
+}
 
 }  // namespace
 
@@ -64,49 +118,14 @@ wxEND_EVENT_TABLE()
     wxIMPLEMENT_APP_NO_MAIN(MyApp);
 
 bool MyApp::OnInit() {
-  Phase("Start");
-
-  const std::string user = wxGetUserId().ToStdString();
-  char lockName[256];
-  std::snprintf(lockName, sizeof lockName, "Lomari-Docuvane-%s", user.c_str());
-  m_checker.reset(new InstanceLock);
-  m_checker->Create(lockName);
-  if (!m_checker->error().empty())
-    TrovMessage("ERROR: InstanceLock ", m_checker->error().c_str(), 5);
-
-  if (m_checker->IsAnotherRunning()) {
-    if (const NativeWindow window = TrovLookupWindow(kWindowName)) {
-      if (IsIconic(window)) OpenIcon(window);
-      BringWindowToTop(window);
-      SetForegroundWindow(window);
-    }
-    const char* const command = Command_Line(argc, argv);
-    unsigned status = kDeliveredStatus;
-    const std::string socketPath = CommandSocketPath();
-    if (socketPath.empty()) {
-      // The running instance cannot serve a channel here either; a second
-      // window would be a second instance.
-      TrovMessage("ERROR: MyApp::OnInit ",
-                  (std::string("command channel off, command not delivered: ") + command).c_str(),
-                  5);
-      status = kChannelOffStatus;
-    } else {
-      bool delivered = false;
-      SendCommand(command, socketPath, &delivered);
-      if (!delivered) {
-        TrovMessage(
-            "ERROR: MyApp::OnInit ",
-            (std::string("command not delivered to the running instance: ") + command).c_str(), 5);
-        status = kNotDeliveredStatus;
-      }
-    }
-    // Returning false makes the framework end the process with its failure
-    // status (-1) after tearing the toolkit down, and that teardown loads
-    // the toolkit's themes first: it costs a later start more than all it
-    // has done so far.  The outcome is the same without it.
-    std::fflush(nullptr);
-    ExitProcess(status);
+  if (g_earlyLock) {
+    m_checker = std::move(g_earlyLock);
+  } else {
+    Phase("Start");
+    m_checker = TakeInstanceLock();
   }
+
+  if (m_checker->IsAnotherRunning()) ForwardAndEnd(argc, argv);
 
   wxInitAllImageHandlers();
 
@@ -175,5 +194,25 @@ int main(int argc, char** argv) {
   // messages never reach the log target.
   wxSetAssertHandler(nullptr);
   wxLog::SetLogLevel(wxLOG_Info);
+  Phase("Start");
+  g_earlyLock = TakeInstanceLock();
+  if (g_earlyLock->IsAnotherRunning()) {
+    // The arguments as the framework would hand them over: wide strings in
+    // the user's locale, which the toolkit would have set by now.
+    std::setlocale(LC_ALL, "");
+    std::vector<wxWCharBuffer> wide;
+    std::vector<const wchar_t*> wideArgv;
+    for (int i = 0; i < argc; ++i) wide.push_back(wxString(argv[i], wxConvLocal).wc_str());
+    for (const wxWCharBuffer& arg : wide) wideArgv.push_back(arg.data());
+    wideArgv.push_back(nullptr);
+    ForwardAndEnd(argc, wideArgv.data());
+  }
+  // The catalogue's first search walks the documentation tree, the panel's
+  // first icon the icon trees; as the running instance, have them walked
+  // while the toolkit starts.
+  if (!g_earlyLock->IsAnotherRunning()) {
+    TrovPrefetchSearch(kDocumentationCategory);
+    TrovPrefetchSearch("Icon");
+  }
   return wxEntry(argc, argv);
 }

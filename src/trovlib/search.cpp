@@ -5,6 +5,7 @@
 #include <cstdlib>
 #include <cstring>
 #include <deque>
+#include <future>
 #include <memory>
 #include <set>
 #include <string>
@@ -15,6 +16,8 @@
 #include "platform/files.h"
 #include "platform/program_dir.h"
 #include "text/text.h"
+#include "trovlib/lsr.h"
+#include "trovlib/prefetch.h"
 #include "trovlib/trovlib.h"
 #include "trovlib/trovlib_internal.h"
 
@@ -69,8 +72,23 @@ std::string TrimDirectory(const std::string& text) {
   return dir;
 }
 
+void AddFile(TreeIndex& index, const std::string& name, std::string path) {
+  const std::string image = ImageName(name);
+  if (!image.empty()) index.by_image_name[image].push_back(path);
+  index.by_name[name].push_back(std::move(path));
+}
+
 std::unique_ptr<TreeIndex> BuildIndex(const std::string& root) {
   auto index = std::make_unique<TreeIndex>();
+  // The tree's own database when it is current, else a walk.
+  std::vector<std::string> listed;
+  if (ReadCurrentLsR(root, listed)) {
+    for (std::string& path : listed) {
+      const std::string name = path.substr(path.rfind('/') + 1);
+      AddFile(*index, name, std::move(path));
+    }
+    return index;
+  }
   std::set<std::pair<std::uint64_t, std::uint64_t>> visited;  // symbolic links may form loops
   std::deque<std::pair<std::string, int>> pending;
   pending.emplace_back(root, 0);
@@ -89,9 +107,7 @@ std::unique_ptr<TreeIndex> BuildIndex(const std::string& root) {
     for (const DirectoryEntry& entry : entries) {
       std::string path = JoinPath(dir, entry.name);
       if (entry.regular) {
-        const std::string image = ImageName(entry.name);
-        if (!image.empty()) index->by_image_name[image].push_back(path);
-        index->by_name[entry.name].push_back(std::move(path));
+        AddFile(*index, entry.name, std::move(path));
       } else if (entry.directory && depth < kMaxTreeDepth) {
         pending.emplace_back(std::move(path), depth + 1);
       }
@@ -100,10 +116,28 @@ std::unique_ptr<TreeIndex> BuildIndex(const std::string& root) {
   return index;
 }
 
+// Indexes being built ahead of their first search (TrovPrefetchSearch), by
+// root.  Guarded by the library mutex like Indexes(); the builders
+// themselves touch neither.
+std::unordered_map<std::string, std::future<std::unique_ptr<TreeIndex>>>& Pending() {
+  static std::unordered_map<std::string, std::future<std::unique_ptr<TreeIndex>>> pending;
+  return pending;
+}
+
 const TreeIndex& IndexOf(const std::string& root) {
   auto& indexes = Indexes();
   auto it = indexes.find(root);
-  if (it == indexes.end()) it = indexes.emplace(root, BuildIndex(root)).first;
+  if (it == indexes.end()) {
+    auto pending = Pending().find(root);
+    if (pending != Pending().end()) {
+      // Built ahead: wait for it rather than walk the tree a second time.
+      std::unique_ptr<TreeIndex> built = pending->second.get();
+      Pending().erase(pending);
+      it = indexes.emplace(root, std::move(built)).first;
+    } else {
+      it = indexes.emplace(root, BuildIndex(root)).first;
+    }
+  }
   return *it->second;
 }
 
@@ -232,36 +266,16 @@ std::vector<std::string> IconThemes() {
   return SplitList(themes ? themes : kDefaultIconThemes);
 }
 
-}  // namespace
+// Each group of roots is searched with its own rules, in order.
+struct Group {
+  std::vector<SearchRoot> roots;
+  bool image_names;
+  bool rank_sizes;
+};
 
-void ResetSearchCaches() { Indexes().clear(); }
-
-}  // namespace trovlib
-
-const char* TrovSearch(const char* spec, const char* name) {
-  using namespace trovlib;
-  static std::string result;
-  if (spec == nullptr || name == nullptr) return nullptr;
-  std::string normal;
-  bool absolute = false;
-  if (!NormaliseName(name, normal, absolute)) return nullptr;
-
-  std::lock_guard<std::mutex> lock(LibraryMutex());
-  const std::string category(spec);
+// Where a search of `category` looks (the caller holds the library mutex).
+std::vector<Group> GroupsOf(const std::string& category) {
   const bool program = category == "Program";
-  if (absolute) {
-    std::string path = "/" + normal;
-    if (!IsRegularFile(path, program)) return nullptr;
-    result = path;
-    return result.c_str();
-  }
-
-  // Each group of roots is searched with its own rules, in order.
-  struct Group {
-    std::vector<SearchRoot> roots;
-    bool image_names;
-    bool rank_sizes;
-  };
   std::vector<Group> groups;
   if (category == kDocumentationCategory) {
     groups.push_back({{}, false, false});
@@ -291,6 +305,38 @@ const char* TrovSearch(const char* spec, const char* name) {
     AddPatternRoots(category, groups.back().roots);
   }
 
+  return groups;
+}
+
+}  // namespace
+
+void ResetSearchCaches() {
+  for (auto& pending : Pending()) pending.second.wait();
+  Pending().clear();
+  Indexes().clear();
+}
+
+}  // namespace trovlib
+
+const char* TrovSearch(const char* spec, const char* name) {
+  using namespace trovlib;
+  static std::string result;
+  if (spec == nullptr || name == nullptr) return nullptr;
+  std::string normal;
+  bool absolute = false;
+  if (!NormaliseName(name, normal, absolute)) return nullptr;
+
+  std::lock_guard<std::mutex> lock(LibraryMutex());
+  const std::string category(spec);
+  const bool program = category == "Program";
+  if (absolute) {
+    std::string path = "/" + normal;
+    if (!IsRegularFile(path, program)) return nullptr;
+    result = path;
+    return result.c_str();
+  }
+
+  const std::vector<Group> groups = GroupsOf(category);
   for (const auto& group : groups) {
     Searcher searcher(normal, group.image_names, program, group.rank_sizes);
     for (const auto& root : group.roots) {
@@ -302,6 +348,20 @@ const char* TrovSearch(const char* spec, const char* name) {
     }
   }
   return nullptr;
+}
+
+void TrovPrefetchSearch(const char* spec) {
+  using namespace trovlib;
+  if (spec == nullptr) return;
+  std::lock_guard<std::mutex> lock(LibraryMutex());
+  for (const Group& group : GroupsOf(spec)) {
+    for (const SearchRoot& root : group.roots) {
+      if (!root.recursive || Indexes().count(root.dir) || Pending().count(root.dir)) continue;
+      // std::async with the async policy: a thread of its own, joined by
+      // the first search that needs the index (or by a reset).
+      Pending().emplace(root.dir, std::async(std::launch::async, BuildIndex, root.dir));
+    }
+  }
 }
 
 void TrovResetCaches() {

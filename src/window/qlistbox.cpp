@@ -31,7 +31,9 @@ QListBox::QListBox(wxWindow* parent, wxWindowID id, const wxPoint& pos, const wx
 }
 
 bool QListBox::Create(wxWindow* parent, wxWindowID id, const wxPoint& pos, const wxSize& size) {
-  Fill_WordIndex(Data);
+  // The count is known at once; the order only when a row is first read,
+  // so the sort runs beside the rest of the window's construction.
+  Fill_WordIndex(Data, true);
   WordCount = static_cast<int>(Data.Words.size());
   const bool created = wxVListBox::Create(parent, id, pos, size, 0, wxVListBoxNameStr);
   SetItemCount(static_cast<size_t>(WordCount));
@@ -42,7 +44,7 @@ bool QListBox::Create(wxWindow* parent, wxWindowID id, const wxPoint& pos, const
 void QListBox::Refill() {
   // The rows point into Data: the control forgets them before they go.
   SetItemCount(0);
-  Fill_WordIndex(Data);
+  Fill_WordIndex(Data, true);
   WordCount = static_cast<int>(Data.Words.size());
   SetItemCount(static_cast<size_t>(WordCount));
   Refresh();
@@ -66,6 +68,7 @@ void QListBox::MeasureRowHeight() {
 }
 
 const char* QListBox::GetWord(int n) const {
+  Data.Wait();
   if (n < 0 || n >= WordCount || n >= static_cast<int>(Data.Words.size())) return "";
   return Data.Words[static_cast<size_t>(n)];
 }
@@ -73,6 +76,7 @@ const char* QListBox::GetWord(int n) const {
 wxString QListBox::GetString(int n) const { return wxString(GetWord(n)); }
 
 void QListBox::OnDrawItem(wxDC& dc, const wxRect& rect, size_t n) const {
+  Data.Wait();
   if (n >= static_cast<size_t>(WordCount) || n >= Data.Words.size()) return;
   dc.DrawText(wxString(Data.Words[n]), rect.GetTopLeft());
 }
@@ -81,5 +85,6 @@ wxCoord QListBox::OnMeasureItem(size_t) const { return RowHeight; }
 
 int FindWordInList(QListBox* list, const char* text, int exact) {
   if (!list || !text) return -1;
+  list->Data.Wait();
   return FindWordInList(list->Data.Words, text, exact);
 }

@@ -2,11 +2,12 @@
 #include "wordindex/wordlist.h"
 
 #include <algorithm>
+#include <cstdint>
 #include <cstdio>
 #include <cstring>
 
-#include "platform/winapi.h"
 #include "base/trace.h"
+#include "platform/winapi.h"
 #include "text/text.h"
 #include "wordindex/wordindex.h"
 
@@ -34,8 +35,38 @@ int CompareIndexWords(const char* a, const char* b) {
   return CompareIgnoringCase(DropLead(a), DropLead(b));
 }
 
-int Fill_WordIndex(WordListData& data) {
+void SortIndexWords(std::vector<const char*>& words) {
+  // Sorted on the first eight folded bytes of each word without its mark,
+  // read as one big-endian number, so that most comparisons are one integer
+  // comparison in a compact array; only equal leads fall back to the words
+  // themselves, from their ninth byte.  A word shorter than eight bytes is
+  // padded with zeros, which order it before every longer word of the same
+  // lead, as the byte comparison does.
+  struct Keyed {
+    std::uint64_t lead;
+    const char* word;
+  };
+  std::vector<Keyed> keyed;
+  keyed.reserve(words.size());
+  for (const char* word : words) {
+    const unsigned char* w = reinterpret_cast<const unsigned char*>(DropLead(word));
+    std::uint64_t lead = 0;
+    int i = 0;
+    for (; i < 8 && w[i] != 0; ++i) lead = (lead << 8) | FoldCase(w[i]);
+    lead <<= 8 * (8 - i);
+    keyed.push_back({lead, word});
+  }
+  std::sort(keyed.begin(), keyed.end(), [](const Keyed& a, const Keyed& b) {
+    if (a.lead != b.lead) return a.lead < b.lead;
+    if ((a.lead & 0xFF) == 0) return false;  // both end within the lead: equal
+    return CompareIgnoringCase(DropLead(a.word) + 8, DropLead(b.word) + 8) < 0;
+  });
+  for (std::size_t i = 0; i < keyed.size(); ++i) words[i] = keyed[i].word;
+}
+
+int Fill_WordIndex(WordListData& data, bool sortInBackground) {
   const DWORD start = GetTickCount();
+  data.Wait();
   data.Words.clear();
   data.RecordBuffer.reset();
   CommandWordCount = 0;
@@ -80,9 +111,14 @@ int Fill_WordIndex(WordListData& data) {
     }
   }
 
-  std::sort(data.Words.begin(), data.Words.end(), [](const char* a, const char* b) {
-    return CompareIgnoringCase(DropLead(a), DropLead(b)) < 0;
-  });
+  if (sortInBackground) {
+    // Nothing else touches the words until Wait(); the record buffer stays
+    // where it is while the vector is sorted.
+    std::vector<const char*>* words = &data.Words;
+    data.Sorting = std::async(std::launch::async, [words] { SortIndexWords(*words); });
+  } else {
+    SortIndexWords(data.Words);
+  }
 
   char elapsed[32];
   snprintf(elapsed, sizeof elapsed, "%d ms", static_cast<int>(GetTickCount() - start));

@@ -2,6 +2,7 @@
 // '@' words skipped, sorted ignoring case and one leading backslash or brace.
 #pragma once
 
+#include <future>
 #include <memory>
 #include <vector>
 
@@ -11,11 +12,22 @@ extern int EnvironmentWordCount;  // listed words that begin with '{'
 struct WordListData {
   std::unique_ptr<char[]> RecordBuffer;  // the word record area, words NUL-terminated
   std::vector<const char*> Words;        // sorted, pointing into RecordBuffer
+  // A sort still running on a worker (Fill_WordIndex in the background):
+  // Words may be read only after Wait().
+  mutable std::future<void> Sorting;
+  void Wait() const {
+    if (Sorting.valid()) Sorting.get();
+  }
 };
 
 // Fills `data` from the open word index, counting its commands and
-// environments from zero; 0 (list empty) when none is open.
-int Fill_WordIndex(WordListData& data);
+// environments from zero; 0 (list empty) when none is open.  With
+// `sortInBackground` the words are read, checked and counted at once but
+// sorted on a worker thread: data.Wait() before reading data.Words.
+int Fill_WordIndex(WordListData& data, bool sortInBackground = false);
+
+// Sorts words into the list's order (CompareIndexWords).
+void SortIndexWords(std::vector<const char*>& words);
 
 // The list's order: <0, 0, >0.
 int CompareIndexWords(const char* a, const char* b);
