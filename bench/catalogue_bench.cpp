@@ -8,12 +8,12 @@
 #include <string>
 #include <vector>
 
+#include "base/settings.h"
 #include "catalogue/documents.h"
 #include "catalogue/keywords.h"
 #include "catalogue/pool.h"
 #include "catalogue/tree.h"
 #include "platform/profile.h"
-#include "base/settings.h"
 #include "test_support.h"
 #include "trovlib/trovlib.h"
 #include "wordindex/index_writer.h"
@@ -27,9 +27,9 @@ constexpr int kDocuments = 8190;
 // [DOC] key names are read in one 32000-byte piece: about 2,000 short keys
 // fit, so the rest of the catalogue comes from word index labels.
 constexpr int kListed = 2000;
-constexpr int kDefinitionEvery = 8;      // one document in 8 has a definition file
+constexpr int kDefinitionEvery = 8;  // one document in 8 has a definition file
 constexpr int kKeysPerDefinition = 20;
-constexpr int kVocabulary = 2000;        // distinct keywords over all definition files
+constexpr int kVocabulary = 2000;  // distinct keywords over all definition files
 
 // A tree whose children are kept in sibling lists, as a tree control does.
 class MemoryTree : public DocumentTreeView {
@@ -194,8 +194,14 @@ void BM_FillTreeOnly(benchmark::State& state) {
   }
 }
 
-BENCHMARK(BM_CollectOnly)->Unit(benchmark::kMillisecond)->Repetitions(5)->ReportAggregatesOnly(true);
-BENCHMARK(BM_FillTreeOnly)->Unit(benchmark::kMillisecond)->Repetitions(5)->ReportAggregatesOnly(true);
+BENCHMARK(BM_CollectOnly)
+    ->Unit(benchmark::kMillisecond)
+    ->Repetitions(5)
+    ->ReportAggregatesOnly(true);
+BENCHMARK(BM_FillTreeOnly)
+    ->Unit(benchmark::kMillisecond)
+    ->Repetitions(5)
+    ->ReportAggregatesOnly(true);
 BENCHMARK(BM_CollectAndFillWarm)
     ->Unit(benchmark::kMillisecond)
     ->Iterations(3)

@@ -62,7 +62,8 @@ void BM_CurlTool(benchmark::State& state) {
   const char* argv[] = {"curl", "-s", "-o", path.c_str(), url.c_str(), nullptr};
   for (auto _ : state) {
     pid_t pid = 0;
-    if (posix_spawnp(&pid, "curl", nullptr, nullptr, const_cast<char* const*>(argv), environ) != 0) {
+    if (posix_spawnp(&pid, "curl", nullptr, nullptr, const_cast<char* const*>(argv), environ) !=
+        0) {
       state.SkipWithError("curl cannot be started");
       break;
     }

@@ -56,8 +56,10 @@ BENCHMARK(BM_FirstCallBuildsIndex)->Unit(benchmark::kMillisecond)->Iterations(5)
 void BM_NameAfterFirstCall(benchmark::State& state) {
   SharedTree();
   TrovResetCaches();
-  if (TrovSearch("TeX system documentation", "f25000.pdf") == nullptr) state.SkipWithError("not found");
-  for (auto _ : state) benchmark::DoNotOptimize(TrovSearch("TeX system documentation", "f25000.pdf"));
+  if (TrovSearch("TeX system documentation", "f25000.pdf") == nullptr)
+    state.SkipWithError("not found");
+  for (auto _ : state)
+    benchmark::DoNotOptimize(TrovSearch("TeX system documentation", "f25000.pdf"));
 }
 BENCHMARK(BM_NameAfterFirstCall)->Unit(benchmark::kMicrosecond);
 
@@ -93,7 +95,8 @@ void BM_MissingName(benchmark::State& state) {
   SharedTree();
   TrovResetCaches();
   TrovSearch("TeX system documentation", "missing.pdf");
-  for (auto _ : state) benchmark::DoNotOptimize(TrovSearch("TeX system documentation", "missing.pdf"));
+  for (auto _ : state)
+    benchmark::DoNotOptimize(TrovSearch("TeX system documentation", "missing.pdf"));
 }
 BENCHMARK(BM_MissingName)->Unit(benchmark::kMicrosecond);
 

@@ -9,9 +9,9 @@
 #include <sys/socket.h>
 #include <unistd.h>
 
-#include <cstdlib>
 #include <atomic>
 #include <chrono>
+#include <cstdlib>
 #include <map>
 #include <mutex>
 #include <string>
@@ -29,9 +29,9 @@ struct HttpReply {
   int status;
   std::string body;
   Headers headers;
-  long long cutAfter = -1;  // send only this many bytes of the body
-  End end = kClose;         // what follows the body
-  bool noLength = false;    // no Content-Length: the end of the connection ends the body
+  long long cutAfter = -1;    // send only this many bytes of the body
+  End end = kClose;           // what follows the body
+  bool noLength = false;      // no Content-Length: the end of the connection ends the body
   std::size_t pieceSize = 0;  // with pieceDelayMs: the body sent in pieces of this size
   int pieceDelayMs = 0;
 };
@@ -96,7 +96,9 @@ class HttpTestServer {
         if (end > 0) std::this_thread::sleep_for(std::chrono::milliseconds(reply.pieceDelayMs));
         end = at == 0 ? ssize_t(std::min(out.size(), head + piece)) : at + ssize_t(piece);
       }
-      if ((sent = send(fd, out.data() + at, std::min<ssize_t>(end, out.size()) - at, MSG_NOSIGNAL)) <= 0) return;
+      if ((sent = send(fd, out.data() + at, std::min<ssize_t>(end, out.size()) - at,
+                       MSG_NOSIGNAL)) <= 0)
+        return;
     }
     if (reply.end == HttpReply::kReset) {  // the close that follows sends a reset
       linger abort{1, 0};

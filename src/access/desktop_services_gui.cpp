@@ -1,20 +1,18 @@
 // The desktop's side of document opening, on wxWidgets.
 #include "access/desktop_services_gui.h"
 
-
 #include <wx/msgdlg.h>
 #include <wx/progdlg.h>
 #include <wx/utils.h>
 #include <wx/window.h>
 
-
 #include "access/download.h"
 #include "access/opendoc.h"
 #include "access/opendoc_gui.h"
 #include "base/busy.h"
-#include "text/wxtext_gui.h"
 #include "platform/findexec.h"
 #include "platform/winapi.h"
+#include "text/wxtext_gui.h"
 
 namespace {
 
@@ -38,7 +36,8 @@ class DialogProgress : public DownloadProgress {
   void Resume() override { dialog_.Resume(); }
   bool AskAbortQuestion() override {
     return AskUser("Are you really want to abort downloading of the module ?",
-                   "Lomari TeX Setup Abort Question", wxYES_NO | wxNO_DEFAULT | wxICON_QUESTION) == wxYES;
+                   "Lomari TeX Setup Abort Question",
+                   wxYES_NO | wxNO_DEFAULT | wxICON_QUESTION) == wxYES;
   }
 
  private:
@@ -85,8 +84,8 @@ int DesktopAccessServices::Download(const std::string& message, const std::strin
                                     const std::string& path) {
   const BusyScope busy;
   wxProgressDialog dialog("Lomari Docs", ToWx(message), 100, parent_,
-                          wxPD_CAN_ABORT | wxPD_AUTO_HIDE | wxPD_ELAPSED_TIME | wxPD_ESTIMATED_TIME |
-                              wxPD_REMAINING_TIME);
+                          wxPD_CAN_ABORT | wxPD_AUTO_HIDE | wxPD_ELAPSED_TIME |
+                              wxPD_ESTIMATED_TIME | wxPD_REMAINING_TIME);
   DialogProgress progress(dialog);
   return wxGet(progress, 0, 100, url.c_str(), path.c_str(), kExpectedSize);
 }

@@ -20,7 +20,8 @@ class DesktopAccessServices : public AccessServices {
   bool LaunchDefaultApplication(const std::string& path) override;
   bool LaunchDefaultBrowser(const std::string& url) override;
   std::string FindExecutable(const std::string& path) override;
-  int Download(const std::string& message, const std::string& url, const std::string& path) override;
+  int Download(const std::string& message, const std::string& url,
+               const std::string& path) override;
   void ShowError(const std::string& message, const std::string& caption) override;
 
   // Test hook.  When set, it answers every message box of document access
@@ -28,7 +29,8 @@ class DesktopAccessServices : public AccessServices {
   // wxNO_DEFAULT | wxICON_QUESTION; return wxYES or wxNO) and the error
   // boxes (style wxOK | wxICON_ERROR; the result is ignored).  It receives
   // message, caption and style.  Clear it with an empty function.
-  using MessageBoxHook = std::function<int(const std::string& message, const std::string& caption, long style)>;
+  using MessageBoxHook =
+      std::function<int(const std::string& message, const std::string& caption, long style)>;
   static MessageBoxHook& TestMessageBoxHook();
 
  private:

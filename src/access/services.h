@@ -20,7 +20,8 @@ class AccessServices {
   virtual std::string FindExecutable(const std::string& path) = 0;
   // Fetches `url` into `path` under a progress window titled "Lomari Docs"
   // whose first message is `message`; returns what wxGet returns.
-  virtual int Download(const std::string& message, const std::string& url, const std::string& path) = 0;
+  virtual int Download(const std::string& message, const std::string& url,
+                       const std::string& path) = 0;
   // A modal error box with an OK button.
   virtual void ShowError(const std::string& message, const std::string& caption) = 0;
 };

@@ -6,9 +6,9 @@
 #include <cstring>
 #include <string>
 
+#include "base/trace.h"
 #include "platform/paths.h"
 #include "platform/profile.h"
-#include "base/trace.h"
 #include "trovlib/trovlib.h"
 
 std::string IniFilePath;

@@ -29,6 +29,7 @@ int TraceLevelOf(const char* message) {
 void TraceMessage(const char* text, const char* argument) {
   std::string message(text ? text : "");
   if (message.size() > kTraceLimit) message.resize(kTraceLimit);
-  if (argument != nullptr) message.append(argument, std::min(std::strlen(argument), kTraceLimit - message.size()));
+  if (argument != nullptr)
+    message.append(argument, std::min(std::strlen(argument), kTraceLimit - message.size()));
   TrovMessage("Docuvane: ", message.c_str(), TraceLevelOf(message.c_str()));
 }

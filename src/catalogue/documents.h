@@ -14,7 +14,7 @@ struct DocumentEntry {
   std::string Language;
   int SearchMode = 0;
   int SameAs = -1;
-  void* TreeItem = nullptr;    // the document's leaf in the tree (wxTreeItemId's id)
+  void* TreeItem = nullptr;  // the document's leaf in the tree (wxTreeItemId's id)
 };
 
 extern DocumentEntry DocumentTable[kMaxDocuments];

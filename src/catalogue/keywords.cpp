@@ -7,12 +7,12 @@
 #include <string>
 #include <vector>
 
-#include "catalogue/documents.h"
-#include "catalogue/pool.h"
-#include "text/text.h"
-#include "platform/profile.h"
 #include "base/settings.h"
 #include "base/trace.h"
+#include "catalogue/documents.h"
+#include "catalogue/pool.h"
+#include "platform/profile.h"
+#include "text/text.h"
 #include "trovlib/trovlib.h"
 
 namespace {
@@ -118,9 +118,8 @@ void LoadKeywords(const char* definitionPath, int documentIndex) {
   }
   if (TraceMode != 0) TraceMessage("Loads Keys from file: ", definitionPath);
 
-  const unsigned long listLength = GetPrivateProfileStringA(kKeywordsSection, nullptr, "",
-                                                            keys.get(), kKeyListSize,
-                                                            definitionPath);
+  const unsigned long listLength = GetPrivateProfileStringA(
+      kKeywordsSection, nullptr, "", keys.get(), kKeyListSize, definitionPath);
   bool cut = false;
   const std::vector<const char*> names = SplitKeyList(keys.get(), listLength, kKeyListSize, cut);
   if (cut) TraceMessage("WARNING: [Keywords] key list cut at 32000 bytes in ", definitionPath);

@@ -8,7 +8,7 @@
 struct KeywordTarget {
   KeywordTarget* Next;  // next (older) target
   char* Anchor;
-  int DocumentIndex;    // into DocumentTable
+  int DocumentIndex;  // into DocumentTable
 };
 
 struct KeywordNode {

@@ -4,11 +4,11 @@
 #include <cwchar>
 #include <string>
 
+#include "base/settings.h"
+#include "base/trace.h"
 #include "catalogue/documents.h"
 #include "catalogue/keywords.h"
 #include "command/command.h"
-#include "base/settings.h"
-#include "base/trace.h"
 #include "text/text.h"
 #include "trovlib/trovlib.h"
 

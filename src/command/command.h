@@ -15,7 +15,7 @@ class CommandPanel {
   virtual bool HasSearchControl() = 0;
   virtual void SetSearchValue(const std::string& text) = 0;  // emits the text event
   virtual bool HasWordList() = 0;
-  virtual int FindWord(const char* text, int exact) = 0;     // FindWordInList
+  virtual int FindWord(const char* text, int exact) = 0;  // FindWordInList
   virtual void SelectWord(int row) = 0;
   virtual std::string GetWord(int row) = 0;
   virtual void ShowTopic(const char* word, int openIfSingle) = 0;

@@ -171,7 +171,8 @@ void RandomAccessFile::Close() {
 }
 
 bool RandomAccessFile::ReadAt(std::int64_t offset, void* buffer, std::size_t count) {
-  if (!IsOpen() || offset < 0 || offset > size_ || static_cast<std::int64_t>(count) > size_ - offset)
+  if (!IsOpen() || offset < 0 || offset > size_ ||
+      static_cast<std::int64_t>(count) > size_ - offset)
     return false;
   if (memory_) {
     if (count > 0) std::memcpy(buffer, bytes_.data() + offset, count);

@@ -1,6 +1,4 @@
 // The per-user instance lock.
-#include "platform/instance_lock.h"
-
 #include <fcntl.h>
 #include <sys/file.h>
 #include <unistd.h>
@@ -9,6 +7,7 @@
 #include <cstring>
 
 #include "platform/files.h"
+#include "platform/instance_lock.h"
 
 InstanceLock::~InstanceLock() { Release(); }
 

@@ -1,10 +1,10 @@
 // The native handle of a toolkit window on GTK: its X11 window id.
-#include "platform/native_window_gui.h"
-
 #include <dlfcn.h>
 #include <wx/window.h>
 
 #include <string>
+
+#include "platform/native_window_gui.h"
 
 // The X11 id of a realised top-level window.  GTK is reached through the
 // symbols the framework has already loaded, so that the program needs no

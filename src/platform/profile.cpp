@@ -1,8 +1,6 @@
 // INI file reading with the rules of the Windows profile API.
 #include "platform/profile.h"
 
-#include "platform/files.h"
-
 #include <algorithm>
 #include <cerrno>
 #include <cstring>
@@ -12,6 +10,8 @@
 #include <unordered_map>
 #include <utility>
 #include <vector>
+
+#include "platform/files.h"
 
 namespace {
 
@@ -26,7 +26,7 @@ struct Section {
 };
 
 struct Profile {
-  std::vector<Section> sections;                        // file order
+  std::vector<Section> sections;                         // file order
   std::unordered_map<std::string, std::size_t> by_name;  // lower-case name -> section
 };
 
@@ -130,8 +130,8 @@ unsigned long CopyList(const std::vector<const std::string*>& names, char* buffe
   return static_cast<unsigned long>(pos);
 }
 
-unsigned long Answer(const Profile* profile, const char* section, const char* key,
-                     const char* def, char* buffer, unsigned long size) {
+unsigned long Answer(const Profile* profile, const char* section, const char* key, const char* def,
+                     char* buffer, unsigned long size) {
   const std::string fallback = def ? def : "";
   if (section == nullptr) {  // list the section names
     std::vector<const std::string*> names;
@@ -155,7 +155,8 @@ unsigned long Answer(const Profile* profile, const char* section, const char* ke
   }
   if (found) {
     auto it = found->by_key.find(Lower(key));
-    if (it != found->by_key.end()) return CopyValue(found->entries[it->second].second, buffer, size);
+    if (it != found->by_key.end())
+      return CopyValue(found->entries[it->second].second, buffer, size);
   }
   return CopyValue(fallback, buffer, size);
 }

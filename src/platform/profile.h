@@ -5,8 +5,8 @@
 
 #include "platform/winapi.h"
 
-// GetPrivateProfileStringA (declared in winapi.h) copies the value of [section] key from `file` into `buffer` (at most
-// size - 1 characters and a NUL) and returns the number of characters
+// GetPrivateProfileStringA (declared in winapi.h) copies the value of [section] key from `file`
+// into `buffer` (at most size - 1 characters and a NUL) and returns the number of characters
 // copied, without the NUL.  A NULL key lists every key line of the section
 // in file order (duplicates included), each NUL-terminated, the list ended
 // by an extra NUL, cut to fit; a value lookup takes the first of duplicate

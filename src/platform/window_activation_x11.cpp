@@ -1,11 +1,11 @@
 // Window activation on X11.
-#include "platform/winapi.h"
-
 #include <X11/Xatom.h>
 #include <X11/Xlib.h>
 #include <X11/Xutil.h>
 
 #include <cstdlib>
+
+#include "platform/winapi.h"
 
 namespace {
 

@@ -12,7 +12,8 @@ bool ContainsIgnoringCase(const std::string& text, const std::string& word) {
 }
 
 bool EndsWithIgnoringCase(const std::string& text, const std::string& tail) {
-  return text.size() >= tail.size() && Folded(text.substr(text.size() - tail.size())) == Folded(tail);
+  return text.size() >= tail.size() &&
+         Folded(text.substr(text.size() - tail.size())) == Folded(tail);
 }
 
 std::size_t Utf8CutLength(const std::string& text, std::size_t limit) {

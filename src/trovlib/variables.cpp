@@ -6,8 +6,8 @@
 #include "platform/dirs.h"
 #include "platform/files.h"
 #include "platform/findexec.h"
-#include "trovlib/trees.h"
 #include "trovlib/sample_tree.h"
+#include "trovlib/trees.h"
 #include "trovlib/trovlib.h"
 #include "trovlib/trovlib_internal.h"
 

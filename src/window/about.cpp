@@ -27,9 +27,10 @@ wxStaticText* CentredText(wxWindow* parent, const wxString& text) {
 }  // namespace
 
 AboutDlg::AboutDlg(wxWindow* parent)
-    : wxDialog(parent, wxID_ANY, "About ...", wxDefaultPosition, wxDefaultSize, wxDEFAULT_DIALOG_STYLE) {
-  SetFont(wxFont(10, wxFONTFAMILY_DEFAULT, wxFONTSTYLE_NORMAL, wxFONTWEIGHT_NORMAL, false, wxEmptyString,
-                 wxFONTENCODING_DEFAULT));
+    : wxDialog(parent, wxID_ANY, "About ...", wxDefaultPosition, wxDefaultSize,
+               wxDEFAULT_DIALOG_STYLE) {
+  SetFont(wxFont(10, wxFONTFAMILY_DEFAULT, wxFONTSTYLE_NORMAL, wxFONTWEIGHT_NORMAL, false,
+                 wxEmptyString, wxFONTENCODING_DEFAULT));
   wxBoxSizer* column = new wxBoxSizer(wxVERTICAL);
 
   if (const char* found = TrovSearch("Logo", "Docuvane")) {
@@ -46,12 +47,14 @@ AboutDlg::AboutDlg(wxWindow* parent)
   title->SetFont(GetFont().Bold());
   title->SetForegroundColour(wxColour(128, 0, 128));
   column->Add(title, 0, wxALIGN_CENTRE_HORIZONTAL);
-  column->Add(CentredText(this, "Lomari TeX Documentation Organizer"), 0, wxALIGN_CENTRE_HORIZONTAL);
+  column->Add(CentredText(this, "Lomari TeX Documentation Organizer"), 0,
+              wxALIGN_CENTRE_HORIZONTAL);
   column->AddSpacer(kGap);
   column->Add(CentredText(this, "Version 5.0 (2011/03/17)"), 0, wxALIGN_CENTRE_HORIZONTAL);
   column->AddSpacer(kGap);
-  column->Add(CentredText(this, wxString::FromUTF8("Copyright \xC2\xA9 2011 Lomari. All rights reserved.")),
-              0, wxALIGN_CENTRE_HORIZONTAL);
+  column->Add(
+      CentredText(this, wxString::FromUTF8("Copyright \xC2\xA9 2011 Lomari. All rights reserved.")),
+      0, wxALIGN_CENTRE_HORIZONTAL);
 
   column->AddSpacer(2 * kGap);
   column->Add(new wxButton(this, wxID_CANCEL, "Close"), 0, wxALIGN_CENTRE_HORIZONTAL);

@@ -10,11 +10,11 @@
 #include <vector>
 
 #include "access/opendoc_gui.h"
-#include "text/wxtext_gui.h"
 #include "catalogue/documents.h"
 #include "catalogue/keywords.h"
 #include "catalogue/tree.h"
 #include "text/text.h"
+#include "text/wxtext_gui.h"
 #include "trovlib/trovlib.h"
 #include "window/panel.h"
 #include "window/qlistbox.h"

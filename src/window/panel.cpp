@@ -19,8 +19,8 @@
 
 #include "text/wxtext_gui.h"
 #include "trovlib/trovlib.h"
-#include "window/picture.h"
 #include "window/ids.h"
+#include "window/picture.h"
 #include "window/qlistbox.h"
 
 namespace {
@@ -41,9 +41,9 @@ wxBEGIN_EVENT_TABLE(Docuvane, wxSplitterWindow)
   EVT_BUTTON(ID_GOTO, Docuvane::OnGotoTarget)
   EVT_SPLITTER_SASH_POS_CHANGED(ID_SPLITTER, Docuvane::OnSashMove)
 wxEND_EVENT_TABLE()
-// clang-format on
+    // clang-format on
 
-Docuvane::Docuvane(wxWindow* parent, const wxPoint& pos, const wxSize& size) {
+    Docuvane::Docuvane(wxWindow* parent, const wxPoint& pos, const wxSize& size) {
   Create(parent, ID_SPLITTER, pos, size, wxSP_3DSASH | wxSP_LIVE_UPDATE, "splitter");
   const wxColour menuColour = wxSystemSettings::GetColour(wxSYS_COLOUR_MENU);
 
@@ -56,10 +56,10 @@ Docuvane::Docuvane(wxWindow* parent, const wxPoint& pos, const wxSize& size) {
   const int sashPosition = FromDIP(static_cast<int>(sashDip));
   m_splitter = this;
 
-  m_tree = new wxTreeCtrl(this, ID_TREE, wxDefaultPosition, wxSize(100, 100),
-                          wxTR_HAS_BUTTONS | wxTR_LINES_AT_ROOT | wxTR_HIDE_ROOT | wxBORDER_STATIC |
-                              wxCLIP_CHILDREN,
-                          wxDefaultValidator, "treeCtrl");
+  m_tree = new wxTreeCtrl(
+      this, ID_TREE, wxDefaultPosition, wxSize(100, 100),
+      wxTR_HAS_BUTTONS | wxTR_LINES_AT_ROOT | wxTR_HIDE_ROOT | wxBORDER_STATIC | wxCLIP_CHILDREN,
+      wxDefaultValidator, "treeCtrl");
   m_tree->SetBackgroundColour(menuColour);
   // The initial size would also become the tree's minimum width; the sash
   // is bounded by the splitter's minimum pane size alone.
@@ -70,14 +70,16 @@ Docuvane::Docuvane(wxWindow* parent, const wxPoint& pos, const wxSize& size) {
   wxBoxSizer* column = new wxBoxSizer(wxVERTICAL);
 
   column->AddSpacer(kGap);
-  wxStaticText* title = new wxStaticText(pane, wxID_ANY, "Index of (La)TeX Commands and Environments",
-                                         wxDefaultPosition, wxDefaultSize, wxALIGN_CENTRE_HORIZONTAL);
+  wxStaticText* title =
+      new wxStaticText(pane, wxID_ANY, "Index of (La)TeX Commands and Environments",
+                       wxDefaultPosition, wxDefaultSize, wxALIGN_CENTRE_HORIZONTAL);
   title->SetFont(title->GetFont().Bold());
   title->SetForegroundColour(wxColour(0, 0, 100));
   column->Add(title, 0, wxEXPAND | wxALL, 0);
   column->AddSpacer(kGap);
 
-  wxStaticText* wordPrompt = new wxStaticText(pane, wxID_ANY, "Type a &Word, or select one from the list.");
+  wxStaticText* wordPrompt =
+      new wxStaticText(pane, wxID_ANY, "Type a &Word, or select one from the list.");
   column->Add(wordPrompt, 0, wxEXPAND | wxLEFT, kGap);
 
   m_search = new wxSearchCtrl(pane, ID_SEARCH, wxEmptyString);
@@ -89,7 +91,8 @@ Docuvane::Docuvane(wxWindow* parent, const wxPoint& pos, const wxSize& size) {
   column->Add(wordRow, 1, wxEXPAND | wxRIGHT, kGap);
   column->AddSpacer(kGap);
 
-  wxStaticText* targetPrompt = new wxStaticText(pane, wxID_ANY, "Then select a Location from the list.");
+  wxStaticText* targetPrompt =
+      new wxStaticText(pane, wxID_ANY, "Then select a Location from the list.");
   column->Add(targetPrompt, 0, wxEXPAND | wxLEFT, kGap);
 
   m_targetList = new wxListBox(pane, ID_TARGET_LIST, wxDefaultPosition, wxDefaultSize, 0, nullptr,
@@ -104,7 +107,8 @@ Docuvane::Docuvane(wxWindow* parent, const wxPoint& pos, const wxSize& size) {
                                   "Help on using the program", iconSize);
   wxButton* internet = MakeIconButton(pane, ID_INTERNET, "&Internet", "internet-web-browser",
                                       "Go to internet based document collection.", iconSize);
-  wxButton* about = MakeIconButton(pane, wxID_ABOUT, "&About", "help-about", "About Docuvane", iconSize);
+  wxButton* about =
+      MakeIconButton(pane, wxID_ABOUT, "&About", "help-about", "About Docuvane", iconSize);
 
   wxBoxSizer* buttonRow = new wxBoxSizer(wxHORIZONTAL);
   buttonRow->Add(help, 0, wxALIGN_CENTRE_VERTICAL);
@@ -134,8 +138,8 @@ Docuvane::~Docuvane() {
     config->Write("/MainWindow/Splitter", static_cast<long>(ToDIP(m_splitter->GetSashPosition())));
 }
 
-wxButton* Docuvane::MakeIconButton(wxWindow* parent, int id, const char* label, const char* iconName,
-                                   const char* toolTip, const wxSize& size) {
+wxButton* Docuvane::MakeIconButton(wxWindow* parent, int id, const char* label,
+                                   const char* iconName, const char* toolTip, const wxSize& size) {
   wxButton* button = nullptr;
   const char* found = TrovSearch("Icon", iconName);
   if (found) {

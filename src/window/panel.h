@@ -35,8 +35,8 @@ class Docuvane : public wxSplitterWindow {
 
   // A picture button from the icon theme when `iconName` is installed, else
   // a text button with `label`.
-  static wxButton* MakeIconButton(wxWindow* parent, int id, const char* label,
-                                  const char* iconName, const char* toolTip, const wxSize& size);
+  static wxButton* MakeIconButton(wxWindow* parent, int id, const char* label, const char* iconName,
+                                  const char* toolTip, const wxSize& size);
 
   // Index pane (wordindex/index_pane_gui.cpp).
   void OnSearch(wxCommandEvent& event);

@@ -7,9 +7,9 @@
 #include <unordered_map>
 
 #include "access/opendoc_gui.h"
-#include "text/wxtext_gui.h"
 #include "catalogue/tree.h"
 #include "command/command.h"
+#include "text/wxtext_gui.h"
 #include "window/panel.h"
 #include "window/qlistbox.h"
 

@@ -2,8 +2,8 @@
 // in the documentation tree.
 #include "wordindex/locate.h"
 
-#include "platform/paths.h"
 #include "base/trace.h"
+#include "platform/paths.h"
 #include "trovlib/trovlib.h"
 #include "wordindex/wordindex.h"
 

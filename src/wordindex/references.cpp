@@ -5,8 +5,8 @@
 #include <cstdio>
 #include <cstring>
 
-#include "text/text.h"
 #include "base/trace.h"
+#include "text/text.h"
 #include "wordindex/wordindex.h"
 
 int LoadWordReferences(int32_t offset, const char* word, std::vector<std::string>& items) {

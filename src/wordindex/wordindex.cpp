@@ -69,8 +69,7 @@ int ReadHeader(RandomAccessFile& f, const char* path) {
   if (groups < 1) return fail("Invalid word lengths in Word Index file: ");
 
   std::vector<unsigned char> table(static_cast<std::size_t>(groups) * 4 + 2);
-  if (!f.ReadAt(4, table.data(), table.size()))
-    return fail("Word Index file is truncated: ");
+  if (!f.ReadAt(4, table.data(), table.size())) return fail("Word Index file is truncated: ");
   const int labels = static_cast<int>(BigEndian(&table[table.size() - 2], 2));
   if (labels > kMaxLabels) return fail("Too many labels in Word Index file: ");
 

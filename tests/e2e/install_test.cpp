@@ -52,7 +52,8 @@ TEST(Install, PutsEverythingInPlaceAndTheProgramFindsItsTree) {
   const bool tex = Shell("kpsewhich -var-value TEXMFDIST >/dev/null 2>&1") == 0 ||
                    std::filesystem::is_directory("/usr/share/texmf") ||
                    std::filesystem::is_directory("/usr/share/texlive");
-  EXPECT_EQ(Count(log, "Docuvane: Private INI file: " + tree + "/Docuvane/Docuvane.ini"), tex ? 0 : 1)
+  EXPECT_EQ(Count(log, "Docuvane: Private INI file: " + tree + "/Docuvane/Docuvane.ini"),
+            tex ? 0 : 1)
       << Describe(log);
   EXPECT_EQ(Count(log, "Docuvane: Document Word Index File: " + tree + "/Update/command.Index"),
             tex ? 0 : 1);

@@ -14,9 +14,8 @@
 #include "base/settings.h"
 #include "catalogue/keywords.h"
 #include "catalogue/pool.h"
-#include "platform/profile.h"
-#include "base/settings.h"
 #include "catalogue/tables.h"
+#include "platform/profile.h"
 #include "test_support.h"  // also filesystem, fstream, optional, string, vector
 #include "window/frame.h"
 #include "window/panel.h"

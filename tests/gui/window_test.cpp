@@ -168,11 +168,12 @@ TEST_F(LookupTest, ALocationIsBoldedInTheTreeAndOpensThroughTheTemplate) {
 // back as the very bytes it was made of: bolded and opened as that file.
 TEST_F(LookupTest, ALabelTheLocaleCannotReadStaysItsOwnBytes) {
   root.Write("texmf/doc/latex/caf\xe9.pdf", "%PDF-1.4\n%%EOF\n");
-  const std::string listing =
-      root.Write("accent.txt", "\\accent\tlatex/base/sample.pdf\t1\n\\accent\tlatex/caf\xe9.pdf\t3\n");
-  ASSERT_EQ(std::system((DOCUVANE_MKINDEX " '" + listing + "' '" + texmf + "/Update/command.Index'")
-                            .c_str()),
-            0);
+  const std::string listing = root.Write(
+      "accent.txt", "\\accent\tlatex/base/sample.pdf\t1\n\\accent\tlatex/caf\xe9.pdf\t3\n");
+  ASSERT_EQ(
+      std::system(
+          (DOCUVANE_MKINDEX " '" + listing + "' '" + texmf + "/Update/command.Index'").c_str()),
+      0);
   ReopenFrame();
   p = panel();
   Show_Topic(p, "\\accent", 0);
@@ -208,7 +209,8 @@ TEST_F(LookupTest, AnUnreadableLogoKeepsItsSlot) {
   TrovResetCaches();
   AboutDlg about(frame);
   int pictures = 0;
-  for (wxWindow* child : about.GetChildren()) pictures += wxDynamicCast(child, wxStaticBitmap) != nullptr;
+  for (wxWindow* child : about.GetChildren())
+    pictures += wxDynamicCast(child, wxStaticBitmap) != nullptr;
   EXPECT_EQ(pictures, 1);
 }
 

@@ -221,9 +221,10 @@ TEST_F(CatalogueTest, PoolKeysAndTheKeywordList) {
     const std::size_t n = DecodeKeyword(key, out, sizeof out);
     EXPECT_EQ(std::string(out, n), decoded) << key;
   }
-  const std::pair<const char*, const char*> names[] = {
-      {"guide.pdf", "guide.ddf"}, {"README", "README.ddf"}, {"a.b.c", "a.b.ddf"},
-      {"tex.v2/README", "tex.v2/README.ddf"}};
+  const std::pair<const char*, const char*> names[] = {{"guide.pdf", "guide.ddf"},
+                                                       {"README", "README.ddf"},
+                                                       {"a.b.c", "a.b.ddf"},
+                                                       {"tex.v2/README", "tex.v2/README.ddf"}};
   for (const auto& [file, ddf] : names) EXPECT_EQ(DefinitionFileName(file), ddf) << file;
 
   AddKeywordTarget("Begin", "b1", 0);

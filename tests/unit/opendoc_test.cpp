@@ -416,10 +416,12 @@ namespace {
 TEST(OpenDocRules, CompleteCopiesAndAbsoluteNames) {
   testing_support::TempDir dir;
   const std::string pad(1100, ' ');
-  const std::pair<std::string, bool> files[] = {
-      {"%PDF-1.4 x startxref\n9\n%%EOF", true}, {"%PDF-1.4" + pad + "startxref", true},
-      {"%PDF-1.4 startxref" + pad, false},      {"%PDF-1", false},
-      {"%PDF-2.0 startxref", false},            {"<html>startxref</html>", false}};
+  const std::pair<std::string, bool> files[] = {{"%PDF-1.4 x startxref\n9\n%%EOF", true},
+                                                {"%PDF-1.4" + pad + "startxref", true},
+                                                {"%PDF-1.4 startxref" + pad, false},
+                                                {"%PDF-1", false},
+                                                {"%PDF-2.0 startxref", false},
+                                                {"<html>startxref</html>", false}};
   for (const auto& [text, complete] : files)
     EXPECT_EQ(Check_Loaded_PDF(dir.Write("f.pdf", text).c_str()), complete) << text.substr(0, 20);
   EXPECT_FALSE(Check_Loaded_PDF((dir / "missing.pdf").c_str()));

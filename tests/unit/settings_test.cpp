@@ -55,10 +55,12 @@ namespace {
 // The trace's level comes from its words: the beginning first, then
 // WARNING, then ERROR, case-sensitively; the message holds 511 characters.
 TEST(Trace, LevelsFromTheWordsAndTheCut) {
-  const std::pair<const char*, int> rows[] = {
-      {"Openning document file: has ERROR", 2}, {"Attach document: /ERROR/x", 4},
-      {"a WARNING and an ERROR", 3},            {"run lower case", 1},
-      {"Launch", 2},                            {"plain", 1}};
+  const std::pair<const char*, int> rows[] = {{"Openning document file: has ERROR", 2},
+                                              {"Attach document: /ERROR/x", 4},
+                                              {"a WARNING and an ERROR", 3},
+                                              {"run lower case", 1},
+                                              {"Launch", 2},
+                                              {"plain", 1}};
   for (const auto& [text, level] : rows) EXPECT_EQ(TraceLevelOf(text), level) << text;
   testing_support::MessageCapture capture;
   TraceMessage(std::string(600, 'a').c_str(), "tail");

@@ -191,9 +191,10 @@ namespace {
 // The list's order, its counters (from zero at every fill) and the
 // bisecting search, against a scan of the sorted list.
 TEST_F(WordIndexTest, WordListOrderCountersAndSearch) {
-  ASSERT_TRUE(Open(BuildIndex("\\alpha\ta.pdf\t1\n{align}\ta.pdf\t1\nAlpha\ta.pdf\t1\n"
-                              "\\@ifnextchar\ta.pdf\t1\n\\Section\ta.pdf\t1\n\\section\ta.pdf\t1\n"
-                              "sectional\ta.pdf\t1\n{section}\ta.pdf\t1\nsec\ta.pdf\t1\n")));
+  ASSERT_TRUE(
+      Open(BuildIndex("\\alpha\ta.pdf\t1\n{align}\ta.pdf\t1\nAlpha\ta.pdf\t1\n"
+                      "\\@ifnextchar\ta.pdf\t1\n\\Section\ta.pdf\t1\n\\section\ta.pdf\t1\n"
+                      "sectional\ta.pdf\t1\n{section}\ta.pdf\t1\nsec\ta.pdf\t1\n")));
   WordListData data;
   for (int fill = 0; fill < 2; ++fill) ASSERT_EQ(Fill_WordIndex(data), 1);
   EXPECT_EQ(CommandWordCount, 3) << "counted once, from zero at every fill";
@@ -210,10 +211,17 @@ TEST_F(WordIndexTest, WordListOrderCountersAndSearch) {
   };
   // text, exact, expected row
   const std::tuple<const char*, int, int> rows[] = {
-      {"", 0, 0},           {"SEC", 0, 3},      {"\\sec", 0, std::min(row("\\Section"), row("\\section"))},
-      {"{sec", 0, 7},       {"section", 1, row("\\section")}, {"sectio", 1, 4},
-      {"sec", 1, 3},        {"alpha}", 0, -1},  {"\\", 0, std::min(row("\\alpha"), row("\\Section"))},
-      {"zzz", 0, -1},       {"{", 0, 0},
+      {"", 0, 0},
+      {"SEC", 0, 3},
+      {"\\sec", 0, std::min(row("\\Section"), row("\\section"))},
+      {"{sec", 0, 7},
+      {"section", 1, row("\\section")},
+      {"sectio", 1, 4},
+      {"sec", 1, 3},
+      {"alpha}", 0, -1},
+      {"\\", 0, std::min(row("\\alpha"), row("\\Section"))},
+      {"zzz", 0, -1},
+      {"{", 0, 0},
   };
   for (const auto& [text, exact, expected] : rows)
     EXPECT_EQ(FindWordInList(data.Words, text, exact), expected) << text << " " << exact;
