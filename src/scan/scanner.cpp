@@ -290,7 +290,9 @@ std::string IniText() {
          "; lists every document of the word index; it is rewritten by each scan.\n"
          "\n[Setup]\nTrace=0\nRoot=\n\n[DOC]\n\n[Extensions]\n"
          "; Opening templates by file extension; without one the desktop's default\n"
-         "; application opens the document.\n;pdf=evince \"%s\"\n";
+         "; application opens the document.  PDF documents open at their page\n"
+         "; through the launcher (see docuvane-open(1) for choosing the viewer).\n"
+         "pdf=<docuvane-open>{ #} ^.pdf\n";
 }
 
 std::string Describe(const IsolatedOutcome& outcome, int timeoutMs) {

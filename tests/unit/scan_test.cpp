@@ -9,6 +9,7 @@
 #include <sstream>
 #include <thread>
 
+#include "platform/profile.h"
 #include "platform/worker.h"
 #include "scan/scanner.h"
 #include "scan/words.h"
@@ -192,6 +193,9 @@ TEST_F(ScanTree, IndexPagesAreThePhysicalPagesTheIndexLinksTo) {
   EXPECT_EQ(result.documents, 5u);
   EXPECT_NE(warnings.find("damaged.pdf: skipped"), std::string::npos) << warnings;
   EXPECT_NE(warnings.find("locked.pdf: skipped, encrypted"), std::string::npos) << warnings;
+  char pdf[64];  // PDF documents open at their page through the launcher
+  GetPrivateProfileStringA("Extensions", "pdf", "", pdf, sizeof pdf, (user / kScanIniFile).c_str());
+  EXPECT_STREQ(pdf, "<docuvane-open>{ #} ^.pdf");
 }
 
 TEST_F(ScanTree, CacheReadsOnlyWhatChanged) {
