@@ -185,6 +185,30 @@ TEST_F(LookupTest, ALabelTheLocaleCannotReadStaysItsOwnBytes) {
   EXPECT_EQ(Run(), Viewer("latex/caf\xe9.pdf", {"page=3 "}));
 }
 
+// A manual scanned by docuvane-mkindex --scan: typing a word it explains lists
+// the physical pages its printed index links to.
+TEST_F(LookupTest, TypingAWordOfAScannedManualListsItsPages) {
+  const std::string manual = texmf + "/doc/latex/demo/manual.pdf", scan = root / "scan";
+  std::filesystem::create_directories(texmf + "/doc/latex/demo");
+  ASSERT_EQ(std::system((DOCUVANE_MKPDF " --manual '" + manual + "'").c_str()), 0);
+  ASSERT_EQ(std::system(("XDG_CACHE_HOME='" + scan + "' " DOCUVANE_MKINDEX " --scan '" + texmf +
+                         "' 2>/dev/null")
+                            .c_str()),
+            0);
+  std::filesystem::copy_file(scan + "/lomari/texmf/Update/command.Index",
+                             texmf + "/Update/command.Index",
+                             std::filesystem::copy_options::overwrite_existing);
+  ReopenFrame();
+  p = panel();
+  Click(p->m_search);
+  ASSERT_TRUE(sim.Text("\\sect"));
+  ASSERT_TRUE(WaitFor([&] {
+    const Args shown = Locations();
+    return std::find(shown.begin(), shown.end(), "latex/demo/manual.pdf#page=3 4 ") != shown.end();
+  })) << p->m_targetList->GetCount()
+      << " locations";
+}
+
 TEST_F(LookupTest, TreeItemsAndButtonsOpenWhatTheyShow) {
   MessageCapture messages;
   DoubleClickItem("Reference");
