@@ -425,10 +425,20 @@ ScanResult Scan_Documentation(const ScanOptions& options) {
 
   WordIndexBuilder builder;
   std::string error;
+  // Labels are numbered in the order of their paths, so that the documents
+  // of one directory follow each other in the catalogue and share its nodes.
+  std::vector<std::string> labels;
+  for (const Document& d : documents) labels.push_back(d.label);
+  std::sort(labels.begin(), labels.end());
+  for (const std::string& label : labels)
+    if (!builder.AddLabel(label, error)) warn(label + ": " + error);
   const auto words = Locations(documents, FindPackages(trees));
   std::vector<bool> labelled(documents.size());
   for (const auto& [word, list] : words)
     for (const Candidate& c : list) {
+      // Words holding '@' are the packages' own internals: the word list
+      // never shows them, and each would be traced at every start.
+      if (word.find('@') != std::string::npos) continue;
       if (c.pages.empty()) continue;
       if (!builder.Add(word, documents[c.document].label, c.pages, error)) {
         warn(documents[c.document].path + ": " + word + ": " + error);

@@ -54,20 +54,23 @@ bool WordIndexBuilder::Add(const std::string& word, const std::string& label,
       return false;
     }
   }
-  auto known = labelIndex_.find(label);
-  int index;
-  if (known != labelIndex_.end()) {
-    index = known->second;
-  } else {
-    if (labels_.size() >= static_cast<std::size_t>(kMaxLabels)) {
-      error = "too many labels (more than 8190)";
-      return false;
-    }
-    labels_.push_back(label);
-    index = static_cast<int>(labels_.size());
-    labelIndex_.emplace(label, index);
+  if (!AddLabel(label, error)) return false;
+  words_[word].push_back({labelIndex_.at(label), pages});
+  return true;
+}
+
+bool WordIndexBuilder::AddLabel(const std::string& label, std::string& error) {
+  if (label.empty() || label.size() > kMaxIndexLabelLength) {
+    error = label.empty() ? "empty label" : "label longer than 255 bytes";
+    return false;
   }
-  words_[word].push_back({index, pages});
+  if (labelIndex_.count(label) != 0) return true;
+  if (labels_.size() >= static_cast<std::size_t>(kMaxLabels)) {
+    error = "too many labels (more than 8190)";
+    return false;
+  }
+  labels_.push_back(label);
+  labelIndex_.emplace(label, static_cast<int>(labels_.size()));
   return true;
 }
 

@@ -27,6 +27,10 @@ class WordIndexBuilder {
   bool Add(const std::string& word, const std::string& label, const std::vector<int>& pages,
            std::string& error);
 
+  // Numbers `label` now if it is new (labels are otherwise numbered as their
+  // first word comes); false with `error` beyond the format's limits.
+  bool AddLabel(const std::string& label, std::string& error);
+
   // Reads a whole listing; false with `error` naming the line on the first
   // bad line.
   bool AddListing(std::istream& in, std::string& error);

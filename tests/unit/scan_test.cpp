@@ -193,6 +193,11 @@ TEST_F(ScanTree, IndexPagesAreThePhysicalPagesTheIndexLinksTo) {
   EXPECT_EQ(result.documents, 5u);
   EXPECT_NE(warnings.find("damaged.pdf: skipped"), std::string::npos) << warnings;
   EXPECT_NE(warnings.find("locked.pdf: skipped, encrypted"), std::string::npos) << warnings;
+  ASSERT_TRUE(OpenWordIndex((user / kScanIndexFile).c_str()));
+  const std::vector<std::string> labels = ListIndexLabels();
+  CloseWordIndex();
+  EXPECT_TRUE(std::is_sorted(labels.begin(), labels.end())) << "a directory's documents together";
+  EXPECT_EQ(labels.size(), result.documents) << "every document once";
   char pdf[64];  // PDF documents open at their page through the launcher
   GetPrivateProfileStringA("Extensions", "pdf", "", pdf, sizeof pdf, (user / kScanIniFile).c_str());
   EXPECT_STREQ(pdf, "<docuvane-open>{ #} ^.pdf");
