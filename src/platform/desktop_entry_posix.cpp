@@ -6,18 +6,11 @@
 
 #include "platform/desktop_entry.h"
 #include "platform/findexec.h"
+#include "text/text.h"
 
 namespace {
 
 constexpr int kHelperTimeoutMs = 5000;
-
-std::string Trim(const std::string& text) {
-  const char* blanks = " \t\r\n";
-  std::size_t begin = text.find_first_not_of(blanks);
-  if (begin == std::string::npos) return std::string();
-  std::size_t end = text.find_last_not_of(blanks);
-  return text.substr(begin, end - begin + 1);
-}
 
 // The escapes of a desktop file's string values: \s \n \t \r \\.
 std::string Unescape(const std::string& value) {
@@ -105,7 +98,7 @@ bool ReadDesktopEntry(const std::string& id, DesktopEntry& entry) {
   bool seen[3] = {false, false, false};
   bool inEntry = false;
   for (std::string line; std::getline(in, line);) {
-    line = Trim(line);
+    line = TrimBlanks(line);
     if (!line.empty() && line[0] == '[') {
       inEntry = line == "[Desktop Entry]";
       continue;
@@ -113,9 +106,9 @@ bool ReadDesktopEntry(const std::string& id, DesktopEntry& entry) {
     for (int k = 0; inEntry && k < 3; ++k) {
       const std::string key = keys[k].first;
       if (seen[k] || line.compare(0, key.size(), key) != 0) continue;
-      std::string rest = Trim(line.substr(key.size()));
+      std::string rest = TrimBlanks(line.substr(key.size()));
       if (rest.empty() || rest[0] != '=') continue;  // another key, or a localised one
-      *keys[k].second = Unescape(Trim(rest.substr(1)));
+      *keys[k].second = Unescape(TrimBlanks(rest.substr(1)));
       seen[k] = true;
     }
   }
@@ -127,7 +120,7 @@ std::string DefaultApplicationId(const std::string& mimeType) {
   const char* query[] = {"xdg-mime", "query", "default", mimeType.c_str(), nullptr};
   if (!RunAndCapture(query, output, kHelperTimeoutMs)) return std::string();
   std::size_t newline = output.find('\n');
-  return Trim(newline == std::string::npos ? output : output.substr(0, newline));
+  return TrimBlanks(newline == std::string::npos ? output : output.substr(0, newline));
 }
 
 std::vector<std::string> SplitDesktopExec(const std::string& value) {

@@ -17,6 +17,7 @@
 #include "platform/desktop_entry.h"
 #include "platform/findexec.h"
 #include "platform/winapi.h"
+#include "text/text.h"
 
 extern char** environ;
 
@@ -24,14 +25,6 @@ namespace {
 
 constexpr int kHelperTimeoutMs = 5000;
 constexpr std::size_t kMaxHelperOutput = 64 * 1024;
-
-std::string Trim(const std::string& text) {
-  const char* blanks = " \t\r\n";
-  std::size_t begin = text.find_first_not_of(blanks);
-  if (begin == std::string::npos) return std::string();
-  std::size_t end = text.find_last_not_of(blanks);
-  return text.substr(begin, end - begin + 1);
-}
 
 bool IsExecutableFile(const std::string& path) {
   struct stat st;
@@ -128,7 +121,7 @@ std::string FindExecutable(const std::string& path) {
   std::string output;
   const char* filetype[] = {"xdg-mime", "query", "filetype", path.c_str(), nullptr};
   if (!RunAndCapture(filetype, output, kHelperTimeoutMs)) return std::string();
-  std::string mime = Trim(output);
+  std::string mime = TrimBlanks(output);
   if (mime.empty() || mime.find('\n') != std::string::npos) return std::string();
 
   DesktopEntry entry;

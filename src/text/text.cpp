@@ -27,3 +27,10 @@ std::size_t Utf8CutLength(const std::string& text, std::size_t limit) {
 std::string CutUtf8(const std::string& text, std::size_t limit) {
   return text.substr(0, Utf8CutLength(text, limit));
 }
+
+std::string TrimBlanks(const std::string& text) {
+  const char* blanks = " \t\r\n";
+  const std::size_t begin = text.find_first_not_of(blanks);
+  if (begin == std::string::npos) return std::string();
+  return text.substr(begin, text.find_last_not_of(blanks) - begin + 1);
+}

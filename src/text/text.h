@@ -22,6 +22,9 @@ inline int CompareIgnoringCase(const char* a, const char* b) {
   }
 }
 
+// `text` without blanks, tabs and line ends at either end.
+std::string TrimBlanks(const std::string& text);
+
 // `text` with its ASCII letters folded.
 std::string Folded(const std::string& text);
 
