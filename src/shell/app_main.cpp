@@ -113,9 +113,9 @@ class MyApp : public wxApp {
 // clang-format off
 wxBEGIN_EVENT_TABLE(MyApp, wxApp)
 wxEND_EVENT_TABLE()
-    // clang-format on
 
-    wxIMPLEMENT_APP_NO_MAIN(MyApp);
+wxIMPLEMENT_APP_NO_MAIN(MyApp);
+// clang-format on
 
 bool MyApp::OnInit() {
   if (g_earlyLock) {

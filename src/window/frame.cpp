@@ -63,9 +63,9 @@ wxBEGIN_EVENT_TABLE(MyFrame, wxFrame)
   EVT_BUTTON(ID_INTERNET, MyFrame::OnInternet)
   EVT_BUTTON(wxID_HELP, MyFrame::OnHelp)
 wxEND_EVENT_TABLE()
-    // clang-format on
+// clang-format on
 
-    MyFrame::MyFrame(const wxString& title)
+MyFrame::MyFrame(const wxString& title)
     : wxFrame(nullptr, wxID_ANY, title, wxDefaultPosition, wxDefaultSize, wxDEFAULT_FRAME_STYLE,
               wxFrameNameStr) {
   long x = kDefaultX, y = kDefaultY, w = kDefaultW, h = kDefaultH;

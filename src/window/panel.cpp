@@ -41,9 +41,9 @@ wxBEGIN_EVENT_TABLE(Docuvane, wxSplitterWindow)
   EVT_BUTTON(ID_GOTO, Docuvane::OnGotoTarget)
   EVT_SPLITTER_SASH_POS_CHANGED(ID_SPLITTER, Docuvane::OnSashMove)
 wxEND_EVENT_TABLE()
-    // clang-format on
+// clang-format on
 
-    Docuvane::Docuvane(wxWindow* parent, const wxPoint& pos, const wxSize& size) {
+Docuvane::Docuvane(wxWindow* parent, const wxPoint& pos, const wxSize& size) {
   Create(parent, ID_SPLITTER, pos, size, wxSP_3DSASH | wxSP_LIVE_UPDATE, "splitter");
   const wxColour menuColour = wxSystemSettings::GetColour(wxSYS_COLOUR_MENU);
 

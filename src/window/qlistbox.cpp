@@ -17,9 +17,10 @@ constexpr int kFallbackRowHeight = 32;
 
 wxIMPLEMENT_DYNAMIC_CLASS(QListBox, wxVListBox);
 
-wxBEGIN_EVENT_TABLE(QListBox, wxVListBox) wxEND_EVENT_TABLE()
+wxBEGIN_EVENT_TABLE(QListBox, wxVListBox)
+wxEND_EVENT_TABLE()
 
-    QListBox::QListBox() {
+QListBox::QListBox() {
   MeasureRowHeight();
   SetMargins(8, 0);
 }
