@@ -216,3 +216,10 @@ int AddDocument(const char* name, const char* fileName, const char* path, const 
   if (Load_Document_Index(n, 1) == 1) entry.SearchMode = SearchModeOf(name);
   return n;
 }
+
+std::string DocumentTitle(const DocumentEntry& entry) {
+  char title[256];
+  GetPrivateProfileStringA("Titles", entry.Path.c_str(), "", title, sizeof title,
+                           IniFilePath.c_str());
+  return title;
+}

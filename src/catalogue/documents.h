@@ -21,4 +21,8 @@ extern DocumentEntry DocumentTable[kMaxDocuments];
 extern int DocumentCount;
 
 void Collect_Documents();
+
+// The document's own title from the [Titles] section of the private INI
+// file (key: the document's Path), or "" when it has none.
+std::string DocumentTitle(const DocumentEntry& entry);
 int AddDocument(const char* name, const char* fileName, const char* path, const char* language);

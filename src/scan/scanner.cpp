@@ -285,14 +285,26 @@ std::map<std::string, std::vector<Candidate>> Locations(
   return words;
 }
 
-std::string IniText() {
-  return "; Docuvane settings written by docuvane-mkindex --scan.  The catalogue\n"
-         "; lists every document of the word index; it is rewritten by each scan.\n"
-         "\n[Setup]\nTrace=0\nRoot=\n\n[DOC]\n\n[Extensions]\n"
-         "; Opening templates by file extension; without one the desktop's default\n"
-         "; application opens the document.  PDF documents open at their page\n"
-         "; through the launcher (see docuvane-open(1) for choosing the viewer).\n"
-         "pdf=<docuvane-open>{ #} ^.pdf\n";
+std::string IniText(const std::vector<Document>& documents) {
+  std::string text =
+      "; Docuvane settings written by docuvane-mkindex --scan.  The catalogue\n"
+      "; lists every document of the word index; it is rewritten by each scan.\n"
+      "\n[Setup]\nTrace=0\nRoot=\n\n[DOC]\n\n[Extensions]\n"
+      "; Opening templates by file extension; without one the desktop's default\n"
+      "; application opens the document.  PDF documents open at their page\n"
+      "; through the launcher (see docuvane-open(1) for choosing the viewer).\n"
+      "pdf=<docuvane-open>{ #} ^.pdf\n"
+      "\n[Titles]\n; The documents' own titles, shown beside their names.\n";
+  for (const Document& d : documents) {
+    // A title is one line; quotes around it would be taken off by the reader.
+    std::string title;
+    for (char c : d.words.title) title += (c == '\n' || c == '\r' || c == '\t') ? ' ' : c;
+    while (!title.empty() && title.back() == ' ') title.pop_back();
+    if (!title.empty() && d.label.find('=') == std::string::npos && d.label[0] != ';' &&
+        d.label[0] != '[')
+      text += d.label + "=\"" + title + "\"\n";
+  }
+  return text;
 }
 
 std::string Describe(const IsolatedOutcome& outcome, int timeoutMs) {
@@ -455,7 +467,7 @@ ScanResult Scan_Documentation(const ScanOptions& options) {
   }
   const std::string indexFile = user + "/" + kScanIndexFile;
   if (!ReplaceFile(indexFile, std::string(bytes.begin(), bytes.end()), 0644) ||
-      !ReplaceFile(user + "/" + kScanIniFile, IniText(), 0644)) {
+      !ReplaceFile(user + "/" + kScanIniFile, IniText(documents), 0644)) {
     result.error = "cannot write " + indexFile + " (user's TeX tree not writable)";
     return result;
   }

@@ -17,6 +17,7 @@
 #include <cstdio>
 #include <string>
 
+#include "catalogue/documents.h"
 #include "text/wxtext_gui.h"
 #include "trovlib/trovlib.h"
 #include "window/ids.h"
@@ -61,6 +62,16 @@ Docuvane::Docuvane(wxWindow* parent, const wxPoint& pos, const wxSize& size) {
       wxTR_HAS_BUTTONS | wxTR_LINES_AT_ROOT | wxTR_HIDE_ROOT | wxBORDER_STATIC | wxCLIP_CHILDREN,
       wxDefaultValidator, "treeCtrl");
   m_tree->SetBackgroundColour(menuColour);
+  // A document's own title, where it has one, as the tool tip of its item.
+  m_tree->Bind(wxEVT_TREE_ITEM_GETTOOLTIP, [](wxTreeEvent& event) {
+    const void* item = event.GetItem().GetID();
+    for (int i = 0; item != nullptr && i < DocumentCount; ++i)
+      if (DocumentTable[i].TreeItem == item) {
+        const std::string title = DocumentTitle(DocumentTable[i]);
+        if (!title.empty()) event.SetToolTip(ToWx(title));
+        return;
+      }
+  });
   // The initial size would also become the tree's minimum width; the sash
   // is bounded by the splitter's minimum pane size alone.
   m_tree->SetMinSize(wxDefaultSize);

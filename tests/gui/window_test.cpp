@@ -186,7 +186,7 @@ TEST_F(LookupTest, ALabelTheLocaleCannotReadStaysItsOwnBytes) {
 }
 
 // A manual scanned by docuvane-mkindex --scan: typing a word it explains lists
-// the physical pages its printed index links to.
+// the physical pages its printed index links to; its title is its tool tip.
 TEST_F(LookupTest, TypingAWordOfAScannedManualListsItsPages) {
   const std::string manual = texmf + "/doc/latex/demo/manual.pdf", scan = root / "scan";
   std::filesystem::create_directories(texmf + "/doc/latex/demo");
@@ -198,6 +198,9 @@ TEST_F(LookupTest, TypingAWordOfAScannedManualListsItsPages) {
   std::filesystem::copy_file(scan + "/lomari/texmf/Update/command.Index",
                              texmf + "/Update/command.Index",
                              std::filesystem::copy_options::overwrite_existing);
+  // The scan's settings after the tree's own (their [Titles] among them).
+  std::ofstream(texmf + "/Docuvane/Docuvane.ini", std::ios::app)
+      << testing_support::ReadAll(scan + "/lomari/texmf/Docuvane/Docuvane.ini");
   ReopenFrame();
   p = panel();
   Click(p->m_search);
@@ -207,6 +210,10 @@ TEST_F(LookupTest, TypingAWordOfAScannedManualListsItsPages) {
     return std::find(shown.begin(), shown.end(), "latex/demo/manual.pdf#page=3 4 ") != shown.end();
   })) << p->m_targetList->GetCount()
       << " locations";
+  // A document's own title is its item's tool tip.
+  wxTreeEvent tip(wxEVT_TREE_ITEM_GETTOOLTIP, p->m_tree, Item("manual.pdf"));
+  p->m_tree->GetEventHandler()->ProcessEvent(tip);
+  EXPECT_EQ(tip.GetToolTip(), "A manual for testing");
 }
 
 TEST_F(LookupTest, TreeItemsAndButtonsOpenWhatTheyShow) {

@@ -202,6 +202,9 @@ TEST_F(ScanTree, IndexPagesAreThePhysicalPagesTheIndexLinksTo) {
   char pdf[64];  // PDF documents open at their page through the launcher
   GetPrivateProfileStringA("Extensions", "pdf", "", pdf, sizeof pdf, (user / kScanIniFile).c_str());
   EXPECT_STREQ(pdf, "<docuvane-open>{ #} ^.pdf");
+  GetPrivateProfileStringA("Titles", "latex/demo/manual.pdf", "", pdf, sizeof pdf,
+                           (user / kScanIniFile).c_str());
+  EXPECT_STREQ(pdf, "A manual for testing") << "the document's own title";
 }
 
 TEST_F(ScanTree, CacheReadsOnlyWhatChanged) {
