@@ -338,6 +338,18 @@ void BM_StartupScannedInstallation(benchmark::State& state) {
 }
 BENCHMARK(BM_StartupScannedInstallation)->Iterations(1)->Unit(benchmark::kMillisecond);
 
+// The same on the sample tree that comes with the program, for a
+// comparison with the scanned installation in one run.
+void BM_StartupSampleTree(benchmark::State& state) {
+  static testing_support::TempDir home;
+  setenv("TEXMF", DOCUVANE_SAMPLE_TEXMF, 1);
+  unsetenv("TEXDIR");
+  setenv("HOME", home.path().c_str(), 1);
+  setenv("XDG_CACHE_HOME", (home / "cache").c_str(), 1);
+  CompareStartups(state, home / "report");
+}
+BENCHMARK(BM_StartupSampleTree)->Iterations(1)->Unit(benchmark::kMillisecond);
+
 // ---------------------------------------------------------------------------
 // Keystroke to filled Locations list, in this process.
 
