@@ -188,6 +188,18 @@ std::string Encrypted() {
                       "<00112233445566778899AABBCCDDEEFF>]");
 }
 
+// Writes the document; the exit status of the tool.
+int WriteFile(const char* path, const std::string& pdf) {
+  std::ofstream out(path, std::ios::binary | std::ios::trunc);
+  out.write(pdf.data(), static_cast<std::streamsize>(pdf.size()));
+  out.close();
+  if (!out) {
+    std::cerr << "docuvane-mkpdf: cannot write " << path << "\n";
+    return 1;
+  }
+  return 0;
+}
+
 }  // namespace
 
 int main(int argc, char** argv) {
@@ -204,14 +216,7 @@ int main(int argc, char** argv) {
       std::cerr << "docuvane-mkpdf: unknown kind " << kind << "\n";
       return 2;
     }
-    std::ofstream out(argv[2], std::ios::binary | std::ios::trunc);
-    out.write(pdf.data(), static_cast<std::streamsize>(pdf.size()));
-    out.close();
-    if (!out) {
-      std::cerr << "docuvane-mkpdf: cannot write " << argv[2] << "\n";
-      return 1;
-    }
-    return 0;
+    return WriteFile(argv[2], pdf);
   }
   if (argc < 3 || argc > 4) {
     std::cerr << "usage: docuvane-mkpdf OUT.pdf \"Title\" [pages]\n";
@@ -227,13 +232,5 @@ int main(int argc, char** argv) {
     }
     pages = static_cast<int>(n);
   }
-  std::ofstream out(argv[1], std::ios::binary | std::ios::trunc);
-  const std::string pdf = Pdf(argv[2], pages);
-  out.write(pdf.data(), static_cast<std::streamsize>(pdf.size()));
-  out.close();
-  if (!out) {
-    std::cerr << "docuvane-mkpdf: cannot write " << argv[1] << "\n";
-    return 1;
-  }
-  return 0;
+  return WriteFile(argv[1], Pdf(argv[2], pages));
 }
