@@ -165,7 +165,9 @@ HttpReply Redirect(int code, const char* to) { return Reply("moved", -1, {}, tru
 class OpenDocTest : public ::testing::Test {
  protected:
   void SetUp() override {
-    SetDownloadLimits({2000, 1});
+    // Short enough for the silent-server rows, long enough that a busy
+    // machine delaying the test server does not look like a stall.
+    SetDownloadLimits({5000, 3});
     root_.Write("texmf/doc/latex/base/installed.pdf", "not even a PDF");
     chmod(root_.Write("bin/viewer", "#!/bin/sh\n").c_str(), 0755);
     RootPath.clear();
