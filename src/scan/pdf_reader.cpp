@@ -353,9 +353,14 @@ class Reader {
 DocumentWords ReadPdfWords(const std::string& path) {
   DocumentWords words;
   GError* error = nullptr;
-  gchar* uri = g_filename_to_uri(path.c_str(), nullptr, &error);
-  PopplerDocument* doc = uri ? poppler_document_new_from_file(uri, nullptr, &error) : nullptr;
-  g_free(uri);
+  // Opened from the mapped file: poppler reads a file it opens itself a few
+  // hundred bytes at a time, a system call each, which costs about a tenth
+  // of the time it takes to read the whole text.
+  GMappedFile* mapped = g_mapped_file_new(path.c_str(), FALSE, &error);
+  GBytes* bytes = mapped ? g_mapped_file_get_bytes(mapped) : nullptr;
+  if (mapped) g_mapped_file_unref(mapped);
+  PopplerDocument* doc = bytes ? poppler_document_new_from_bytes(bytes, nullptr, &error) : nullptr;
+  if (bytes) g_bytes_unref(bytes);
   if (!doc) {
     if (error && error->domain == POPPLER_ERROR && error->code == POPPLER_ERROR_ENCRYPTED)
       words.error = "encrypted, needs a password";
