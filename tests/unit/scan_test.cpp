@@ -245,6 +245,16 @@ TEST_F(ScanTree, ACancelledOrFailedScanLeavesTheOldFiles) {
   EXPECT_EQ(before,
             std::string((std::istreambuf_iterator<char>(again)), std::istreambuf_iterator<char>()));
 
+  // More documents than the index has labels for: refused, never cut.
+  fs::create_directories(tree / "doc/html/many");
+  for (int k = 0; k < kMaxLabels; ++k)
+    std::ofstream(tree / "doc/html/many" / ("p" + std::to_string(k) + ".html")) << "";
+  EXPECT_NE(Scan().error.find(" documents found, but the word index holds 8190 at most"),
+            std::string::npos);
+  std::ifstream third(user / kScanIndexFile, std::ios::binary);
+  EXPECT_EQ(before,
+            std::string((std::istreambuf_iterator<char>(third)), std::istreambuf_iterator<char>()));
+
   fs::remove_all(tree / "doc");
   EXPECT_NE(Scan().error.find("no PDF documents found"), std::string::npos);
   std::ofstream(dir / "file") << "";
