@@ -61,6 +61,10 @@ bool WalkOrder(const std::string& a, const std::string& b) {
 
 bool ReadCurrentLsR(const std::string& root, std::vector<std::string>& files) {
   files.clear();
+  return ReadCurrentLsR(root, [&files](std::string_view path) { files.emplace_back(path); });
+}
+
+bool ReadCurrentLsR(const std::string& root, const std::function<void(std::string_view)>& each) {
   FileStamp database;
   const std::string top = FindDatabase(root, database);
   if (top.empty()) return false;
@@ -157,7 +161,7 @@ bool ReadCurrentLsR(const std::string& root, std::vector<std::string>& files) {
       while (subdirectory != subdirectories.end() && *subdirectory < name) ++subdirectory;
       if (subdirectory != subdirectories.end() && *subdirectory == name) continue;
       path.assign(prefix).append(name);
-      files.push_back(path);
+      each(path);
     }
   }
   return true;

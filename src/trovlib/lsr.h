@@ -4,7 +4,9 @@
 // is current.
 #pragma once
 
+#include <functional>
 #include <string>
+#include <string_view>
 #include <vector>
 
 namespace trovlib {
@@ -22,5 +24,9 @@ namespace trovlib {
 // back, so a file added anywhere is caught at its directory or, for a new
 // directory, at the listed directory above it).
 bool ReadCurrentLsR(const std::string& root, std::vector<std::string>& files);
+
+// The same, each path handed to `each` (only once the database is known to
+// be current, so nothing is handed over when the answer is false).
+bool ReadCurrentLsR(const std::string& root, const std::function<void(std::string_view)>& each);
 
 }  // namespace trovlib

@@ -9,6 +9,7 @@
 #include <memory>
 #include <set>
 #include <string>
+#include <string_view>
 #include <unordered_map>
 #include <utility>
 #include <vector>
@@ -29,27 +30,120 @@ constexpr const char* kImageExtensions[] = {".png", ".xpm", ".bmp", ".ico"};
 constexpr const char* kIconSizes[] = {"24x24", "22x22", "16x16", "32x32"};
 constexpr int kMaxTreeDepth = 64;
 
+// `name` with an image extension folded to lower case, or "" when its
+// extension is no image extension.
+std::string ImageName(std::string_view name) {
+  const std::size_t dot = name.rfind('.');
+  if (dot == std::string_view::npos || name.find('/', dot) != std::string_view::npos)
+    return std::string();
+  const std::string extension = Folded(std::string(name.substr(dot)));
+  for (const char* known : kImageExtensions)
+    if (extension == known) return std::string(name.substr(0, dot)) + extension;
+  return std::string();
+}
+
+// Entries by a key, each key's entries chained in the order they were given:
+// an open-addressed table of the first entry of every key.  Built once; the
+// keys stay where they were.
+class KeyTable {
+ public:
+  void Build(const std::vector<std::string_view>& keys) {
+    std::size_t size = 16;
+    while (size < 2 * keys.size()) size *= 2;
+    slots_.assign(size, -1);
+    next_.assign(keys.size(), -1);
+    const std::size_t mask = size - 1;
+    // From the last entry back, each one put in front of its key's chain.
+    for (std::size_t i = keys.size(); i-- > 0;) {
+      if (keys[i].empty()) continue;
+      for (std::size_t slot = std::hash<std::string_view>()(keys[i]) & mask;;
+           slot = (slot + 1) & mask) {
+        const std::int32_t head = slots_[slot];
+        if (head < 0 || keys[static_cast<std::size_t>(head)] == keys[i]) {
+          next_[i] = head;
+          slots_[slot] = static_cast<std::int32_t>(i);
+          break;
+        }
+      }
+    }
+  }
+  // The first entry of `key`, or -1.
+  std::int32_t First(const std::vector<std::string_view>& keys, std::string_view key) const {
+    if (slots_.empty() || key.empty()) return -1;
+    const std::size_t mask = slots_.size() - 1;
+    for (std::size_t slot = std::hash<std::string_view>()(key) & mask;; slot = (slot + 1) & mask) {
+      const std::int32_t head = slots_[slot];
+      if (head < 0 || keys[static_cast<std::size_t>(head)] == key) return head;
+    }
+  }
+  std::int32_t Next(std::int32_t entry) const { return next_[static_cast<std::size_t>(entry)]; }
+
+ private:
+  std::vector<std::int32_t> slots_;
+  std::vector<std::int32_t> next_;
+};
+
 // Every file below one directory, by base name.  Paths of one name keep the
 // walk's order: shallower first, then by byte order of the names, so that the
 // same tree always gives the same answer.
 // Image files are also kept under their name with the extension folded to
 // lower case: the trees this library reads were often made on file systems
 // that ignore case, so "Docuvane.BMP" must answer for "Docuvane.bmp".
-struct TreeIndex {
-  std::unordered_map<std::string, std::vector<std::string>> by_name;
-  std::unordered_map<std::string, std::vector<std::string>> by_image_name;
-};
+// All paths share one buffer: a tree of tens of thousands of files is then a
+// few allocations, not one per file and name.
+class TreeIndex {
+ public:
+  void Add(std::string_view path) {
+    const std::size_t slash = path.rfind('/');
+    const std::size_t nameAt = slash == std::string_view::npos ? 0 : slash + 1;
+    entries_.push_back(Entry{paths_.size(), path.size(), nameAt});
+    paths_.append(path);
+    const std::string image = ImageName(path.substr(nameAt));
+    imageKeys_.push_back(Span{imageText_.size(), image.size()});
+    imageText_ += image;
+  }
 
-// `name` with an image extension folded to lower case, or "" when its
-// extension is no image extension.
-std::string ImageName(const std::string& name) {
-  const std::size_t dot = name.rfind('.');
-  if (dot == std::string::npos || name.find('/', dot) != std::string::npos) return std::string();
-  const std::string extension = Folded(name.substr(dot));
-  for (const char* known : kImageExtensions)
-    if (extension == known) return name.substr(0, dot) + extension;
-  return std::string();
-}
+  void Finish() {
+    names_.clear();
+    images_.clear();
+    names_.reserve(entries_.size());
+    images_.reserve(entries_.size());
+    for (std::size_t i = 0; i < entries_.size(); ++i) {
+      names_.push_back(Path(i).substr(entries_[i].nameAt));
+      images_.emplace_back(imageText_.data() + imageKeys_[i].at, imageKeys_[i].length);
+    }
+    byName_.Build(names_);
+    byImage_.Build(images_);
+  }
+
+  std::string_view Path(std::size_t i) const {
+    return std::string_view(paths_).substr(entries_[i].at, entries_[i].length);
+  }
+
+  // Calls `visit(path)` for the paths of this name (or image name) in walk
+  // order, until it returns false.
+  template <typename Visit>
+  void ForEach(bool images, std::string_view name, Visit visit) const {
+    const KeyTable& table = images ? byImage_ : byName_;
+    const std::vector<std::string_view>& keys = images ? images_ : names_;
+    for (std::int32_t i = table.First(keys, name); i >= 0; i = table.Next(i))
+      if (!visit(Path(static_cast<std::size_t>(i)))) return;
+  }
+
+ private:
+  struct Entry {
+    std::size_t at, length, nameAt;
+  };
+  struct Span {
+    std::size_t at, length;
+  };
+  std::string paths_;
+  std::vector<Entry> entries_;
+  std::string imageText_;
+  std::vector<Span> imageKeys_;
+  std::vector<std::string_view> names_, images_;
+  KeyTable byName_, byImage_;
+};
 
 std::unordered_map<std::string, std::unique_ptr<TreeIndex>>& Indexes() {
   static std::unordered_map<std::string, std::unique_ptr<TreeIndex>> indexes;
@@ -72,21 +166,11 @@ std::string TrimDirectory(const std::string& text) {
   return dir;
 }
 
-void AddFile(TreeIndex& index, const std::string& name, std::string path) {
-  const std::string image = ImageName(name);
-  if (!image.empty()) index.by_image_name[image].push_back(path);
-  index.by_name[name].push_back(std::move(path));
-}
-
 std::unique_ptr<TreeIndex> BuildIndex(const std::string& root) {
   auto index = std::make_unique<TreeIndex>();
   // The tree's own database when it is current, else a walk.
-  std::vector<std::string> listed;
-  if (ReadCurrentLsR(root, listed)) {
-    for (std::string& path : listed) {
-      const std::string name = path.substr(path.rfind('/') + 1);
-      AddFile(*index, name, std::move(path));
-    }
+  if (ReadCurrentLsR(root, [&index](std::string_view path) { index->Add(path); })) {
+    index->Finish();
     return index;
   }
   std::set<std::pair<std::uint64_t, std::uint64_t>> visited;  // symbolic links may form loops
@@ -107,12 +191,13 @@ std::unique_ptr<TreeIndex> BuildIndex(const std::string& root) {
     for (const DirectoryEntry& entry : entries) {
       std::string path = JoinPath(dir, entry.name);
       if (entry.regular) {
-        AddFile(*index, entry.name, std::move(path));
+        index->Add(path);
       } else if (entry.directory && depth < kMaxTreeDepth) {
         pending.emplace_back(std::move(path), depth + 1);
       }
     }
   }
+  index->Finish();
   return index;
 }
 
@@ -181,7 +266,7 @@ void AddPatternRoots(const std::string& pattern, std::vector<SearchRoot>& roots)
 
 // How much an icon's directory is preferred: 24, 22, 16, 32 pixels, then
 // anything else.
-int IconSizeRank(const std::string& path, std::size_t from) {
+int IconSizeRank(std::string_view path, std::size_t from) {
   for (int i = 0; i < 4; ++i) {
     std::string step = std::string("/") + kIconSizes[i] + "/";
     if (path.find(step, from) != std::string::npos) return i;
@@ -219,37 +304,38 @@ class Searcher {
     const TreeIndex& index = IndexOf(root.dir);
     // Best is the lowest size rank, then the earliest variant, then the
     // earliest path; without ranking the first match wins at once.
-    const std::string* best = nullptr;
+    std::string_view best;
+    bool haveBest = false;
     int best_rank = 5;
-    const auto& names = images ? index.by_image_name : index.by_name;
     for (const auto& given : variants_) {
       const std::string variant = images ? ImageName(given) : given;
-      std::size_t slash = variant.rfind('/');
-      auto it = names.find(slash == std::string::npos ? variant : variant.substr(slash + 1));
-      if (it == names.end()) continue;
-      for (const auto& path : it->second) {
-        // (a conditional expression would copy every path it looks at)
+      const std::size_t slash = variant.rfind('/');
+      const std::string_view base = slash == std::string::npos
+                                        ? std::string_view(variant)
+                                        : std::string_view(variant).substr(slash + 1);
+      index.ForEach(images, base, [&](std::string_view path) {
         if (slash != std::string::npos &&
             !(images ? HasTail(ImageName(path), variant) : HasTail(path, variant)))
-          continue;
-        if (executable_ && !IsRegularFile(path, true)) continue;
-        int rank = rank_sizes_ ? IconSizeRank(path, root.dir.size()) : 0;
+          return true;
+        if (executable_ && !IsRegularFile(std::string(path), true)) return true;
+        const int rank = rank_sizes_ ? IconSizeRank(path, root.dir.size()) : 0;
         if (rank < best_rank) {
-          best = &path;
+          best = path;
+          haveBest = true;
           best_rank = rank;
         }
-        if (best_rank == 0) break;
-      }
+        return best_rank != 0;
+      });
       if (best_rank == 0) break;
     }
-    if (best == nullptr) return false;
-    found = *best;
+    if (!haveBest) return false;
+    found.assign(best.data(), best.size());
     return true;
   }
 
  private:
   // The name's directories must end the found path, step for step.
-  static bool HasTail(const std::string& path, const std::string& tail) {
+  static bool HasTail(std::string_view path, std::string_view tail) {
     if (path.size() <= tail.size()) return false;
     std::size_t at = path.size() - tail.size();
     return path[at - 1] == '/' && path.compare(at, tail.size(), tail) == 0;
