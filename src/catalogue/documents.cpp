@@ -142,6 +142,9 @@ void AppendLabels() {
 }  // namespace
 
 void Collect_Documents() {
+  // Thousands of lookups in the INI file and the definition files: each
+  // file is checked against the disk once for all of them.
+  ProfileBatch batch;
   std::unique_ptr<char[]> keys(new (std::nothrow) char[kKeyListSize]);
   if (!keys) {
     TraceMessage("ERROR: Not available memory to collect document list", "");

@@ -2,7 +2,9 @@
 #include "platform/profile.h"
 
 #include <algorithm>
+#include <atomic>
 #include <cerrno>
+#include <cstdint>
 #include <cstring>
 #include <memory>
 #include <mutex>
@@ -164,7 +166,12 @@ unsigned long Answer(const Profile* profile, const char* section, const char* ke
 struct CachedFile {
   FileStamp stamp;
   std::shared_ptr<const Profile> profile;
+  std::uint64_t checkedInBatch = 0;  // the batch whose first lookup checked it
 };
+
+// The batch open on this thread (0: none); batches are numbered from 1.
+thread_local std::uint64_t t_batch = 0;
+std::atomic<std::uint64_t> g_lastBatch{0};
 
 std::mutex& CacheMutex() {
   static std::mutex mutex;
@@ -205,16 +212,30 @@ std::string ResolvePath(const char* file) {
 }
 
 std::shared_ptr<const Profile> Load(const std::string& path) {
+  const std::uint64_t batch = t_batch;
+  if (batch != 0) {
+    std::lock_guard<std::mutex> lock(CacheMutex());
+    auto it = Cache().find(path);
+    if (it != Cache().end() && it->second.checkedInBatch == batch) return it->second.profile;
+  }
   FileStamp stamp;
-  if (!StampOf(path, stamp) || !stamp.regular) return nullptr;
+  const bool present = StampOf(path, stamp) && stamp.regular;
   std::lock_guard<std::mutex> lock(CacheMutex());
   auto& cache = Cache();
   auto it = cache.find(path);
-  if (it != cache.end() && it->second.stamp == stamp) return it->second.profile;
+  if (!present) {
+    // Missing files are remembered too, so that a batch asks once.
+    if (batch != 0) cache[path] = CachedFile{FileStamp{}, nullptr, batch};
+    return nullptr;
+  }
+  if (it != cache.end() && it->second.profile && it->second.stamp == stamp) {
+    it->second.checkedInBatch = batch;
+    return it->second.profile;
+  }
   std::string text;
   if (!ReadWholeFile(path, text, kMaxFileBytes)) return nullptr;
   std::shared_ptr<const Profile> profile = Parse(text.data(), text.size());
-  cache[path] = CachedFile{stamp, profile};
+  cache[path] = CachedFile{stamp, profile, batch};
   return profile;
 }
 
@@ -225,6 +246,14 @@ DWORD GetPrivateProfileStringA(const char* section, const char* key, const char*
   std::shared_ptr<const Profile> profile;
   if (file != nullptr && *file != '\0') profile = Load(ResolvePath(file));
   return Answer(profile.get(), section, key, def, buffer, size);
+}
+
+ProfileBatch::ProfileBatch() : outermost_(t_batch == 0) {
+  if (outermost_) t_batch = ++g_lastBatch;
+}
+
+ProfileBatch::~ProfileBatch() {
+  if (outermost_) t_batch = 0;
 }
 
 void ProfileCacheClear() {

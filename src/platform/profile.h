@@ -17,6 +17,21 @@
 // a file within the same second call this.
 void ProfileCacheClear();
 
+// While one lives on a thread, each file that thread reads is checked
+// against the disk once: a batch of thousands of lookups (the catalogue's
+// start-up) then costs one status call per file instead of one per lookup.
+// Outside such a scope every lookup sees the file as it is now.
+class ProfileBatch {
+ public:
+  ProfileBatch();
+  ~ProfileBatch();
+  ProfileBatch(const ProfileBatch&) = delete;
+  ProfileBatch& operator=(const ProfileBatch&) = delete;
+
+ private:
+  bool outermost_;
+};
+
 // Parses INI text held in memory (used by the fuzz target and its replay).
 // Looks the key up as GetPrivateProfileStringA would.
 unsigned long ProfileStringFromText(const char* text, std::size_t length, const char* section,

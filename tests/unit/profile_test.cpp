@@ -60,6 +60,32 @@ TEST(Profile, ValuesListsAndCuts) {
   }
 }
 
+// A batch checks each file once; before and after it every lookup sees the
+// file as it is (a batch left open would serve stale values for good).
+TEST(Profile, ABatchChecksEachFileOnce) {
+  testing_support::TempDir dir;
+  const std::string file = dir.Write("a.ini", "[S]\nk=one\n");
+  const std::string missing = dir / "later.ini";
+  auto read = [](const std::string& path) {
+    char value[16];
+    GetPrivateProfileStringA("S", "k", "none", value, sizeof value, path.c_str());
+    return std::string(value);
+  };
+  EXPECT_EQ(read(file), "one");
+  {
+    ProfileBatch batch;
+    EXPECT_EQ(read(file), "one");
+    EXPECT_EQ(read(missing), "none");
+    dir.Write("a.ini", "[S]\nk=second\n");
+    dir.Write("later.ini", "[S]\nk=new\n");
+    ProfileBatch inner;
+    EXPECT_EQ(read(file), "one");
+    EXPECT_EQ(read(missing), "none");
+  }
+  EXPECT_EQ(read(file), "second");
+  EXPECT_EQ(read(missing), "new");
+}
+
 TEST(ProfileFuzzReplay, EveryCorpusInputRuns) {
   int replayed = 0;
   for (const auto& entry : std::filesystem::directory_iterator(DOCUVANE_FUZZ_CORPUS "/profile")) {
