@@ -199,6 +199,7 @@ int RunChild(int argc, char** argv, bool docuvane) {
     wxInitAllImageHandlers();
     wxConfigBase::Get();
     Docuvane_Init(OpenInstalledWordIndex);
+    Start_Collect_Documents();
     frame = new MyFrame("Lomari Docuvane");
   } else {
     frame = new wxFrame(nullptr, wxID_ANY, "Empty");

@@ -5,6 +5,7 @@
 #include <algorithm>
 #include <cstdint>
 #include <cstring>
+#include <future>
 #include <memory>
 #include <new>
 #include <string>
@@ -141,7 +142,16 @@ void AppendLabels() {
 
 }  // namespace
 
-void Collect_Documents() {
+namespace {
+
+void ResetDocumentTable() {
+  for (int i = 0; i < DocumentCount; ++i) DocumentTable[i] = DocumentEntry{};
+  DocumentCount = 0;
+  g_lookup.Clear();
+}
+
+// The documents of the INI file's [DOC] section, with their definition files.
+void CollectListedDocuments() {
   // Thousands of lookups in the INI file and the definition files: each
   // file is checked against the disk once for all of them.
   ProfileBatch batch;
@@ -150,10 +160,6 @@ void Collect_Documents() {
     TraceMessage("ERROR: Not available memory to collect document list", "");
     return;
   }
-
-  for (int i = 0; i < DocumentCount; ++i) DocumentTable[i] = DocumentEntry{};
-  DocumentCount = 0;
-  g_lookup.Clear();
 
   const unsigned long listLength =
       GetPrivateProfileStringA("DOC", nullptr, "", keys.get(), kKeyListSize, IniFilePath.c_str());
@@ -180,8 +186,36 @@ void Collect_Documents() {
     if (TraceMode != 0) TraceMessage("Attach document: ", path.c_str());
     AddDocument(key, value, path.c_str(), "ENG");
   }
-  keys.reset();
+}
 
+// The collection started ahead, with the messages it held back.
+std::future<std::vector<TrovHeldMessage>> g_collecting;
+
+}  // namespace
+
+void Start_Collect_Documents() {
+  if (g_collecting.valid()) return;
+  ResetDocumentTable();
+  g_collecting = std::async(std::launch::async, [] {
+    std::vector<TrovHeldMessage> held;
+    TrovHoldMessages(&held);
+    CollectListedDocuments();
+    TrovHoldMessages(nullptr);
+    return held;
+  });
+}
+
+void Finish_Started_Collection() {
+  if (g_collecting.valid()) TrovReplayMessages(g_collecting.get());
+}
+
+void Collect_Documents() {
+  if (g_collecting.valid()) {
+    Finish_Started_Collection();
+  } else {
+    ResetDocumentTable();
+    CollectListedDocuments();
+  }
   if (WordIndexHandle != nullptr && LabelCount >= 1) AppendLabels();
 }
 

@@ -12,6 +12,7 @@
 #include "wordindex/wordlist.h"
 
 void Clear_Tables() {
+  Finish_Started_Collection();
   for (int i = 0; i < DocumentCount; ++i) DocumentTable[i] = DocumentEntry{};
   DocumentCount = 0;
   KeywordListReset();

@@ -16,6 +16,7 @@
 
 #include "base/settings.h"
 #include "base/trace.h"
+#include "catalogue/documents.h"
 #include "command/client_gui.h"
 #include "command/command.h"
 #include "command/server_gui.h"
@@ -140,6 +141,8 @@ bool MyApp::OnInit() {
   const std::string commandLine = Command_Line(argc, argv);
 
   Docuvane_Init(OpenInstalledWordIndex);
+  // The INI file's documents are read while the window is being built.
+  Start_Collect_Documents();
 
   Phase("Frame ...");
   MyFrame* frame = new MyFrame(ToWx(AppTitle));

@@ -2,6 +2,7 @@
 #include <cstdlib>
 #include <mutex>
 #include <string>
+#include <vector>
 
 #include "platform/files.h"
 #include "trovlib/trovlib.h"
@@ -19,6 +20,8 @@ TrovMessageSink& Sink() {
   static TrovMessageSink sink;
   return sink;
 }
+
+thread_local std::vector<TrovHeldMessage>* t_held = nullptr;
 
 int StderrLevel() {
   const char* text = std::getenv("TROVLIB_STDERR_LEVEL");
@@ -43,6 +46,10 @@ std::string OneLine(const char* prefix, const char* text) {
 void TrovMessage(const char* prefix, const char* text, int level) {
   if (prefix == nullptr) prefix = "";
   if (text == nullptr) text = "";
+  if (t_held != nullptr) {
+    t_held->push_back(TrovHeldMessage{prefix, text, level});
+    return;
+  }
   const std::string line = OneLine(prefix, text);
 
   if (level >= StderrLevel()) WriteToStandardError(line + "\n");
@@ -66,4 +73,10 @@ void TrovMessage(const char* prefix, const char* text, int level) {
 void TrovSetMessageSink(TrovMessageSink sink) {
   std::lock_guard<std::mutex> lock(SinkMutex());
   Sink() = std::move(sink);
+}
+
+void TrovHoldMessages(std::vector<TrovHeldMessage>* held) { t_held = held; }
+
+void TrovReplayMessages(const std::vector<TrovHeldMessage>& held) {
+  for (const TrovHeldMessage& m : held) TrovMessage(m.prefix.c_str(), m.text.c_str(), m.level);
 }

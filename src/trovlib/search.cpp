@@ -406,7 +406,7 @@ void ResetSearchCaches() {
 
 const char* TrovSearch(const char* spec, const char* name) {
   using namespace trovlib;
-  static std::string result;
+  thread_local std::string result;  // each thread keeps its own answer
   if (spec == nullptr || name == nullptr) return nullptr;
   std::string normal;
   bool absolute = false;

@@ -1,12 +1,15 @@
 // The TeX system's path-search and message library, as the program sees it.
 //
 // Strings are 8-bit and NUL-terminated.  A string result belongs to the
-// library and stays valid until the next search call (TrovSearch, TrovFind,
-// TrovVar, TrovINIFile); a TrovMessage call in between leaves it intact.
+// library and stays valid until the same thread's next search call
+// (TrovSearch, TrovFind, TrovVar, TrovINIFile); a TrovMessage call in
+// between leaves it intact.
 // Callers copy what they keep and never free it.
 #pragma once
 
 #include <functional>
+#include <string>
+#include <vector>
 
 // The search category of installed documents, ".ddf" files and the word index.
 constexpr const char* kDocumentationCategory = "TeX system documentation";
@@ -40,6 +43,17 @@ void TrovMessage(const char* prefix, const char* text, int level);
 // Pass an empty function to remove it.
 using TrovMessageSink = std::function<void(const char* prefix, const char* text, int level)>;
 void TrovSetMessageSink(TrovMessageSink sink);
+
+// Messages of the calling thread are kept in `held`, in their order, while
+// it is set (nullptr: written again); TrovReplayMessages writes them as if
+// they were given now.  Work done ahead on a thread of its own thus reports
+// where it would have reported had it been done in its place.
+struct TrovHeldMessage {
+  std::string prefix, text;
+  int level;
+};
+void TrovHoldMessages(std::vector<TrovHeldMessage>* held);
+void TrovReplayMessages(const std::vector<TrovHeldMessage>& held);
 
 // Forgets every cached file-name index and variable lookup, so that a test
 // can change the environment or the trees and search again.

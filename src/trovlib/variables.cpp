@@ -237,7 +237,7 @@ bool ExpandPattern(const std::string& pattern, std::vector<std::string>& out, bo
 using trovlib::LibraryMutex;
 
 const char* TrovVar(const char* name) {
-  static std::string result;
+  thread_local std::string result;  // each thread keeps its own answer
   if (name == nullptr) return nullptr;
   std::lock_guard<std::mutex> lock(LibraryMutex());
   std::string value;
@@ -247,7 +247,7 @@ const char* TrovVar(const char* name) {
 }
 
 const char* TrovFind(const char* pattern) {
-  static std::string result;
+  thread_local std::string result;  // each thread keeps its own answer
   std::lock_guard<std::mutex> lock(LibraryMutex());
   std::string inner = pattern ? pattern : "";
   if (inner.size() >= 3 && inner.compare(0, 2, "?<") == 0 && inner.back() == '>')
@@ -263,7 +263,7 @@ const char* TrovFind(const char* pattern) {
 }
 
 const char* TrovINIFile(int kind) {
-  static std::string result;
+  thread_local std::string result;  // each thread keeps its own answer
   std::lock_guard<std::mutex> lock(LibraryMutex());
   result.clear();
   if (kind != 1) return result.c_str();

@@ -2,11 +2,14 @@
 #include <gtest/gtest.h>
 
 #include <algorithm>
+#include <chrono>
 #include <deque>
 #include <sstream>
+#include <thread>
 #include <tuple>
 
 #include "base/settings.h"
+#include "base/trace.h"
 #include "catalogue/documents.h"
 #include "catalogue/keywords.h"
 #include "catalogue/pool.h"
@@ -112,20 +115,41 @@ TEST_F(CatalogueTest, DocumentsWithDuplicatesGapsAndSearchFlags) {
       "Manuals>Guide=guide.pdf\nMANUALS>guide=guide.pdf\nEmpty=\nAbsent=absent.pdf\n"
       "P>doc=p.pdf\nN>doc=n.pdf\nY>doc=y.pdf\n*Star=star.pdf\nNoDdf=noddf.pdf\n",
       {"p.pdf", "n.pdf", "y.pdf", "star.pdf", "noddf.pdf", "guide.pdf"});
-  MessageCapture capture;
-  Collect_Documents();
-  Collect_Documents();  // a second collection starts from an empty table
-  // Name, file, search mode, a definition file: the case-folded repeat is not added;
-  // flags "p", "N", none ("Y"), a leading "*" over "N", and none without a definition file.
-  std::string table;
-  for (int i = 0; i < DocumentCount; ++i)
-    table += DocumentTable[i].Name + " " + DocumentTable[i].Path.substr(tex_.path().size()) + " " +
-             std::to_string(DocumentTable[i].SearchMode) +
-             (DocumentTable[i].DefinitionFile.empty() ? "\n" : " ddf\n");
-  EXPECT_EQ(table,
-            "Manuals>Guide /doc/guide.pdf 0\nP>doc /doc/p.pdf 2 ddf\nN>doc /doc/n.pdf 0 ddf\n"
-            "Y>doc /doc/y.pdf 1 ddf\n*Star /doc/star.pdf 2 ddf\nNoDdf /doc/noddf.pdf 0\n");
-  EXPECT_TRUE(capture.messages().empty()) << "empty values and unfound files are silent";
+  {
+    MessageCapture capture;
+    Collect_Documents();
+    EXPECT_TRUE(capture.messages().empty()) << "empty values and unfound files are silent";
+  }
+  // Once in place, once started ahead on its own thread and taken over: the
+  // same table, and the same messages, written where the collection stands.
+  std::vector<std::string> traced[2];
+  for (bool ahead : {false, true}) {
+    MessageCapture capture;
+    TraceMode = 1;
+    KeywordListReset(), PoolReset();
+    if (ahead) {
+      Start_Collect_Documents();
+      std::this_thread::sleep_for(std::chrono::milliseconds(50));
+    }
+    TraceMessage("Collecting now");
+    Collect_Documents();  // starts from an empty table
+    TraceMode = 0;
+    for (const auto& m : capture.messages()) traced[ahead].push_back(m.line());
+    // Name, file, search mode, a definition file: the case-folded repeat is not added;
+    // flags "p", "N", none ("Y"), a leading "*" over "N", and none without a definition file.
+    std::string table;
+    for (int i = 0; i < DocumentCount; ++i)
+      table += DocumentTable[i].Name + " " + DocumentTable[i].Path.substr(tex_.path().size()) +
+               " " + std::to_string(DocumentTable[i].SearchMode) +
+               (DocumentTable[i].DefinitionFile.empty() ? "\n" : " ddf\n");
+    EXPECT_EQ(table,
+              "Manuals>Guide /doc/guide.pdf 0\nP>doc /doc/p.pdf 2 ddf\nN>doc /doc/n.pdf 0 ddf\n"
+              "Y>doc /doc/y.pdf 1 ddf\n*Star /doc/star.pdf 2 ddf\nNoDdf /doc/noddf.pdf 0\n");
+    EXPECT_EQ(DumpList(), "\\x: a@4 a@3 a@2 a@1\n") << "ahead: " << ahead;
+  }
+  ASSERT_GT(traced[0].size(), 1u);
+  EXPECT_EQ(traced[0].front(), "Docuvane: Collecting now");
+  EXPECT_EQ(traced[0], traced[1]);
 }
 
 TEST_F(CatalogueTest, LabelsFollowTheIniDocumentsUpToTheTableSize) {
