@@ -29,6 +29,8 @@ set(CPACK_DEBIAN_FILE_NAME DEB-DEFAULT)
 set(CPACK_DEBIAN_PACKAGE_SECTION tex)
 # The libraries the binaries link, as dpkg-shlibdeps finds them.
 set(CPACK_DEBIAN_PACKAGE_SHLIBDEPS ON)
+# Loaded when first needed, so not seen by dpkg-shlibdeps: downloads need libcurl.
+set(CPACK_DEBIAN_PACKAGE_DEPENDS "libcurl4 | libcurl3-gnutls, libpoppler-glib8")
 set(CPACK_DEBIAN_PACKAGE_RECOMMENDS "xdg-utils, evince | okular | zathura | mupdf | qpdfview | atril")
 set(CPACK_DEBIAN_PACKAGE_SUGGESTS "texlive-latex-base-doc")
 set(CPACK_PACKAGING_INSTALL_PREFIX /usr)

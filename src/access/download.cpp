@@ -1,8 +1,6 @@
 // The document transfer on libcurl.
 #include "access/download.h"
 
-#include <curl/curl.h>
-
 #include <algorithm>
 #include <cctype>
 #include <chrono>
@@ -12,6 +10,7 @@
 #include <cstring>
 #include <mutex>
 
+#include "access/curl_api.h"
 #include "pdf/pdf_check.h"
 #include "platform/partfile.h"
 #include "text/text.h"
@@ -28,10 +27,8 @@ constexpr long kCurlBufferSize = 128 * 1024;
 std::mutex g_limitsMutex;
 DownloadLimits g_limits;
 
-void InitCurlOnce() {
-  static std::once_flag once;
-  std::call_once(once, [] { curl_global_init(CURL_GLOBAL_DEFAULT); });
-}
+// The loaded library (set before the first transfer's first call).
+const CurlApi* g_curl = nullptr;
 
 void Error(const char* prefix, const std::string& text) { TrovMessage(prefix, text.c_str(), 5); }
 
@@ -68,18 +65,18 @@ std::string EscapeUrl(const std::string& url) {
 
 std::string UrlPart(CURLU* url, CURLUPart part) {
   char* value = nullptr;
-  if (curl_url_get(url, part, &value, 0) != CURLUE_OK || value == nullptr) return std::string();
+  if (g_curl->url_get(url, part, &value, 0) != CURLUE_OK || value == nullptr) return std::string();
   std::string result(value);
-  curl_free(value);
+  g_curl->free(value);
   return result;
 }
 
 struct CurlUrl {
   CURLU* handle = nullptr;
-  CurlUrl() : handle(curl_url()) {}
+  CurlUrl() : handle(g_curl->url()) {}
   explicit CurlUrl(CURLU* h) : handle(h) {}
   ~CurlUrl() {
-    if (handle) curl_url_cleanup(handle);
+    if (handle) g_curl->url_cleanup(handle);
   }
   CurlUrl(const CurlUrl&) = delete;
   CurlUrl& operator=(const CurlUrl&) = delete;
@@ -159,7 +156,7 @@ size_t OnData(char* data, size_t size, size_t count, void* user) {
   if (!t.bodySeen) {
     t.bodySeen = true;
     long code = 0;
-    curl_easy_getinfo(t.easy, CURLINFO_RESPONSE_CODE, &code);
+    g_curl->easy_getinfo(t.easy, CURLINFO_RESPONSE_CODE, &code);
     if (t.http && IsRedirection(code)) t.redirected = true;
   }
   if (t.redirected) return 0;  // stop: the body of a redirection is not the document
@@ -183,17 +180,17 @@ size_t OnData(char* data, size_t size, size_t count, void* user) {
 
 // Runs one request to its end, keeping the dialog alive between arrivals.
 CURLcode Perform(CURLM* multi, Transfer& t) {
-  curl_multi_add_handle(multi, t.easy);
+  g_curl->multi_add_handle(multi, t.easy);
   CURLcode result = CURLE_OK;
   bool done = false;
   for (;;) {
     int running = 0;
-    if (curl_multi_perform(multi, &running) != CURLM_OK) {
+    if (g_curl->multi_perform(multi, &running) != CURLM_OK) {
       result = CURLE_FAILED_INIT;
       break;
     }
     int queued = 0;
-    while (CURLMsg* msg = curl_multi_info_read(multi, &queued)) {
+    while (CURLMsg* msg = g_curl->multi_info_read(multi, &queued)) {
       if (msg->msg == CURLMSG_DONE) {
         result = msg->data.result;
         done = true;
@@ -202,19 +199,19 @@ CURLcode Perform(CURLM* multi, Transfer& t) {
     if (done || running == 0 || t.aborted) break;
     t.KeepAliveIfDue();
     if (t.aborted) break;
-    curl_multi_poll(multi, nullptr, 0, kKeepAliveMs, nullptr);
+    g_curl->multi_poll(multi, nullptr, 0, kKeepAliveMs, nullptr);
   }
   if (t.aborted && !done) result = CURLE_ABORTED_BY_CALLBACK;
-  curl_multi_remove_handle(multi, t.easy);
+  g_curl->multi_remove_handle(multi, t.easy);
   return result;
 }
 
 struct CurlHandles {
-  CURL* easy = curl_easy_init();
-  CURLM* multi = curl_multi_init();
+  CURL* easy = g_curl->easy_init();
+  CURLM* multi = g_curl->multi_init();
   ~CurlHandles() {
-    if (easy) curl_easy_cleanup(easy);
-    if (multi) curl_multi_cleanup(multi);
+    if (easy) g_curl->easy_cleanup(easy);
+    if (multi) g_curl->multi_cleanup(multi);
   }
 };
 
@@ -224,12 +221,12 @@ struct CurlHandles {
 // whole PDF file, which a body cut at a revision's end or one short is not.
 bool IsComplete(Transfer& t, CURLcode result, long code, const std::string& source) {
   curl_off_t announced = -1;
-  curl_easy_getinfo(t.easy, CURLINFO_CONTENT_LENGTH_DOWNLOAD_T, &announced);
+  g_curl->easy_getinfo(t.easy, CURLINFO_CONTENT_LENGTH_DOWNLOAD_T, &announced);
   std::string problem;
   if (t.writeFailed) {
     Error("ERROR: wxGet can't write file: ", t.targetPath);
   } else if (result != CURLE_OK) {
-    Error("ERROR: wxGet transfer failed for ", source + " (" + curl_easy_strerror(result) + ")");
+    Error("ERROR: wxGet transfer failed for ", source + " (" + g_curl->easy_strerror(result) + ")");
   } else if (t.http && code != 200) {
     Error("ERROR: wxGet no document at ", source + " (HTTP " + std::to_string(code) + ")");
   } else if (announced >= 0 && announced != t.count) {
@@ -268,13 +265,18 @@ DownloadLimits GetDownloadLimits() {
 
 int wxGet(DownloadProgress& dialog, int first, int last, const char* url, const char* path,
           int expected) {
-  InitCurlOnce();
   const std::string source = url ? url : "";
+  std::string why;
+  g_curl = LoadCurl(&why);
+  if (g_curl == nullptr) {
+    Error("ERROR: wxGet can't load the HTTP library for ", source + " (" + why + ")");
+    return 0;
+  }
   const DownloadLimits limits = GetDownloadLimits();
 
   CurlUrl current;
   if (current.handle == nullptr ||
-      curl_url_set(current.handle, CURLUPART_URL, EscapeUrl(source).c_str(), 0) != CURLUE_OK) {
+      g_curl->url_set(current.handle, CURLUPART_URL, EscapeUrl(source).c_str(), 0) != CURLUE_OK) {
     Error("ERROR: wxGet can't initialize - ", source);
     return 0;
   }
@@ -312,25 +314,25 @@ int wxGet(DownloadProgress& dialog, int first, int last, const char* url, const 
     t.bodySeen = t.redirected = t.responseSeen = false;
     t.location.clear();
 
-    curl_easy_reset(t.easy);
-    curl_easy_setopt(t.easy, CURLOPT_URL, address.c_str());
+    g_curl->easy_reset(t.easy);
+    g_curl->easy_setopt(t.easy, CURLOPT_URL, address.c_str());
     // Only the first address may use any scheme; redirections lead to the web.
-    curl_easy_setopt(t.easy, CURLOPT_PROTOCOLS_STR, redirections == 0 ? "all" : "http,https");
-    curl_easy_setopt(t.easy, CURLOPT_FOLLOWLOCATION, 0L);
-    curl_easy_setopt(t.easy, CURLOPT_NOSIGNAL, 1L);
-    curl_easy_setopt(t.easy, CURLOPT_CONNECTTIMEOUT_MS, limits.connectTimeoutMs);
-    curl_easy_setopt(t.easy, CURLOPT_LOW_SPEED_LIMIT, 1L);
-    curl_easy_setopt(t.easy, CURLOPT_LOW_SPEED_TIME, limits.stallTimeoutS);
-    curl_easy_setopt(t.easy, CURLOPT_BUFFERSIZE, kCurlBufferSize);
-    curl_easy_setopt(t.easy, CURLOPT_USERAGENT, "Docuvane/5.0");
-    curl_easy_setopt(t.easy, CURLOPT_HEADERFUNCTION, OnHeader);
-    curl_easy_setopt(t.easy, CURLOPT_HEADERDATA, &t);
-    curl_easy_setopt(t.easy, CURLOPT_WRITEFUNCTION, OnData);
-    curl_easy_setopt(t.easy, CURLOPT_WRITEDATA, &t);
+    g_curl->easy_setopt(t.easy, CURLOPT_PROTOCOLS_STR, redirections == 0 ? "all" : "http,https");
+    g_curl->easy_setopt(t.easy, CURLOPT_FOLLOWLOCATION, 0L);
+    g_curl->easy_setopt(t.easy, CURLOPT_NOSIGNAL, 1L);
+    g_curl->easy_setopt(t.easy, CURLOPT_CONNECTTIMEOUT_MS, limits.connectTimeoutMs);
+    g_curl->easy_setopt(t.easy, CURLOPT_LOW_SPEED_LIMIT, 1L);
+    g_curl->easy_setopt(t.easy, CURLOPT_LOW_SPEED_TIME, limits.stallTimeoutS);
+    g_curl->easy_setopt(t.easy, CURLOPT_BUFFERSIZE, kCurlBufferSize);
+    g_curl->easy_setopt(t.easy, CURLOPT_USERAGENT, "Docuvane/5.0");
+    g_curl->easy_setopt(t.easy, CURLOPT_HEADERFUNCTION, OnHeader);
+    g_curl->easy_setopt(t.easy, CURLOPT_HEADERDATA, &t);
+    g_curl->easy_setopt(t.easy, CURLOPT_WRITEFUNCTION, OnData);
+    g_curl->easy_setopt(t.easy, CURLOPT_WRITEDATA, &t);
 
     result = Perform(curl.multi, t);
     code = 0;
-    curl_easy_getinfo(t.easy, CURLINFO_RESPONSE_CODE, &code);
+    g_curl->easy_getinfo(t.easy, CURLINFO_RESPONSE_CODE, &code);
 
     if (t.aborted || !t.http || !IsRedirection(code)) break;
 
@@ -343,9 +345,9 @@ int wxGet(DownloadProgress& dialog, int first, int last, const char* url, const 
       Error("ERROR: wxGet too many redirections for ", source);
       return 0;
     }
-    CurlUrl next(curl_url_dup(current.handle));
-    if (next.handle == nullptr ||
-        curl_url_set(next.handle, CURLUPART_URL, EscapeUrl(t.location).c_str(), 0) != CURLUE_OK) {
+    CurlUrl next(g_curl->url_dup(current.handle));
+    if (next.handle == nullptr || g_curl->url_set(next.handle, CURLUPART_URL,
+                                                  EscapeUrl(t.location).c_str(), 0) != CURLUE_OK) {
       Error("ERROR: wxGet can't initialize - ", source);
       return 0;
     }

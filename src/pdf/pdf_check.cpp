@@ -10,7 +10,9 @@
 #include <cstdint>
 #include <cstring>
 #include <memory>
+#include <mutex>
 
+#include "platform/dynamic_library.h"
 #include "platform/files.h"
 
 namespace {
@@ -75,20 +77,57 @@ struct GObjectUnref {
   void operator()(void* object) const { g_object_unref(object); }
 };
 
+// The PDF library, loaded on the first check: the program needs it only for
+// downloads, and it brings the colour, image and signature libraries along.
+struct PopplerApi {
+  decltype(&::poppler_document_new_from_file) new_from_file;
+  decltype(&::poppler_document_get_n_pages) get_n_pages;
+  decltype(&::poppler_error_quark) error_quark;
+};
+
+const PopplerApi* LoadPoppler(std::string& reason) {
+  static PopplerApi api;
+  static const PopplerApi* loaded = nullptr;
+  static std::string why;
+  static std::once_flag once;
+  std::call_once(once, [] {
+    static DynamicLibrary library;
+    if (!library.Open({"libpoppler-glib.so.8"}, &why)) return;
+    api.new_from_file = reinterpret_cast<decltype(api.new_from_file)>(
+        library.Symbol("poppler_document_new_from_file"));
+    api.get_n_pages =
+        reinterpret_cast<decltype(api.get_n_pages)>(library.Symbol("poppler_document_get_n_pages"));
+    api.error_quark =
+        reinterpret_cast<decltype(api.error_quark)>(library.Symbol("poppler_error_quark"));
+    if (!api.new_from_file || !api.get_n_pages || !api.error_quark)
+      why = "libpoppler-glib lacks a function it should have";
+    else
+      loaded = &api;
+  });
+  reason = why;
+  return loaded;
+}
+
 bool PopplerOpens(const std::string& path, std::string& problem) {
+  std::string reason;
+  const PopplerApi* poppler = LoadPoppler(reason);
+  if (poppler == nullptr) {
+    problem = "cannot be checked, the PDF library does not load: " + reason;
+    return false;
+  }
   char* absolute = g_canonicalize_filename(path.c_str(), nullptr);
   GError* error = nullptr;
   char* uri = g_filename_to_uri(absolute, nullptr, &error);
   g_free(absolute);
   std::unique_ptr<PopplerDocument, GObjectUnref> document;
-  if (uri != nullptr) document.reset(poppler_document_new_from_file(uri, nullptr, &error));
+  if (uri != nullptr) document.reset(poppler->new_from_file(uri, nullptr, &error));
   g_free(uri);
   // A document that asks for a password is whole; it is just not ours to read.
-  const bool encrypted =
-      error != nullptr && error->domain == POPPLER_ERROR && error->code == POPPLER_ERROR_ENCRYPTED;
+  const bool encrypted = error != nullptr && error->domain == poppler->error_quark() &&
+                         error->code == POPPLER_ERROR_ENCRYPTED;
   if (document == nullptr && !encrypted)
     problem = std::string("unreadable: ") + (error ? error->message : "no document");
-  else if (document != nullptr && poppler_document_get_n_pages(document.get()) < 1)
+  else if (document != nullptr && poppler->get_n_pages(document.get()) < 1)
     problem = "no pages";
   if (error != nullptr) g_error_free(error);
   return problem.empty();
