@@ -1,8 +1,9 @@
 // The window on large data:
 //  - start-up to the shown window on a TeX tree of 50,000 files and 8,190
 //    documents, with 200,000 and 800,000 index words, against the floor of a
-//    process of the same binary that only shows an empty frame and exits
-//    (both timed as whole processes, with their peak resident memory);
+//    minimal toolkit program that only shows an empty frame and exits
+//    (bench/empty_frame.cpp; both timed as whole processes, with their peak
+//    resident memory);
 //    DOCUVANE_BENCH_TREE=<dir> keeps the tree there between runs, and
 //    `--child=docuvane` with TEXMF and TEXDIR set runs one start by itself
 //    (for a profiler);
@@ -182,28 +183,21 @@ struct StartupTree {
 // ---------------------------------------------------------------------------
 // Child processes for the start-up comparison.
 
-int RunChild(int argc, char** argv, bool docuvane) {
+int RunChild(int argc, char** argv) {
   // As the program's main does before the toolkit starts.
-  if (docuvane) {
-    TrovPrefetchSearch(kDocumentationCategory);
-    TrovPrefetchSearch("Icon");
-  }
+  TrovPrefetchSearch(kDocumentationCategory);
+  TrovPrefetchSearch("Icon");
   if (!wxEntryStart(argc, argv)) return 2;
   wxTheApp->CallOnInit();
   wxLog::EnableLogging(false);
-  wxFrame* frame;
-  if (docuvane) {
-    // What start-up does before showing the window.
-    wxTheApp->SetAppName("Docuvane");
-    wxTheApp->SetVendorName("Lomari");
-    wxInitAllImageHandlers();
-    wxConfigBase::Get();
-    Docuvane_Init(OpenInstalledWordIndex);
-    Start_Collect_Documents();
-    frame = new MyFrame("Lomari Docuvane");
-  } else {
-    frame = new wxFrame(nullptr, wxID_ANY, "Empty");
-  }
+  // What start-up does before showing the window.
+  wxTheApp->SetAppName("Docuvane");
+  wxTheApp->SetVendorName("Lomari");
+  wxInitAllImageHandlers();
+  wxConfigBase::Get();
+  Docuvane_Init(OpenInstalledWordIndex);
+  Start_Collect_Documents();
+  wxFrame* frame = new MyFrame("Lomari Docuvane");
   frame->Show();
   while (!frame->IsShownOnScreen()) {
     wxYield();
@@ -281,7 +275,7 @@ void CompareStartups(benchmark::State& state, const std::string& reportFile) {
   for (auto _ : state) {
     for (int round = 0; round < 9; ++round) {
       double peak = 0;
-      empty.push_back(RunProcess("--child=empty", &peak));
+      empty.push_back(RunProcess("--child=empty", &peak, DOCUVANE_EMPTY_FRAME));
       emptyPeak.push_back(peak);
       docuvane.push_back(RunProcess("--child=docuvane", &peak));
       docuvanePeak.push_back(peak);
@@ -433,8 +427,7 @@ class BenchApp : public wxApp {
 wxIMPLEMENT_APP_NO_MAIN(BenchApp);
 
 int main(int argc, char** argv) {
-  if (argc == 2 && std::strcmp(argv[1], "--child=empty") == 0) return RunChild(argc, argv, false);
-  if (argc == 2 && std::strcmp(argv[1], "--child=docuvane") == 0) return RunChild(argc, argv, true);
+  if (argc == 2 && std::strcmp(argv[1], "--child=docuvane") == 0) return RunChild(argc, argv);
   benchmark::Initialize(&argc, argv);
   if (!wxEntryStart(argc, argv)) {
     std::fprintf(stderr,

@@ -11,38 +11,23 @@
 #include <string>
 
 class ChannelServer;
-class ChannelClient;
 
-// A framework connection whose operations go through this transport
-// instead of the framework's own socket classes.
+// The server's end of a framework connection, whose operations go through
+// this transport instead of the framework's own socket classes.
 class ChannelConnection : public wxConnection {
  public:
   ChannelConnection() = default;
   ~ChannelConnection() override;
 
-  const void* Request(const wxString& item, size_t* size = nullptr,
-                      wxIPCFormat format = wxIPC_TEXT) override;
-  bool StartAdvise(const wxString& item) override;
-  bool StopAdvise(const wxString& item) override;
-  // Client side: ends the conversation and waits, within a bound, until
-  // the server has taken everything sent before; see Delivered().
+  // Ends the conversation from this end.
   bool Disconnect() override;
-  // True when the server took every message of the conversation without a
-  // failure and closed it after the end message.
-  bool Delivered() const { return delivered_; }
 
  protected:
-  bool DoExecute(const void* data, size_t size, wxIPCFormat format) override;
-  bool DoPoke(const wxString& item, const void* data, size_t size, wxIPCFormat format) override;
   bool DoAdvise(const wxString& item, const void* data, size_t size, wxIPCFormat format) override;
 
  private:
   friend class ChannelServer;
-  friend class ChannelClient;
-  ChannelServer* server_ = nullptr;        // server side: the transport serving it
-  std::unique_ptr<ChannelClient> client_;  // client side: its own socket
-  std::string reply_;                      // the last request's reply
-  bool delivered_ = false;
+  ChannelServer* server_ = nullptr;  // the transport serving it
 };
 
 // The server's end: a listening socket whose conversations are read as
@@ -73,33 +58,3 @@ class ChannelServer {
   void Forget(ChannelConnection* connection);
   std::unique_ptr<Impl> impl_;
 };
-
-// How opening a conversation went.
-enum class ChannelOpen {
-  kOpened,
-  kNoServer,  // nothing takes connections at the path (yet): worth another try
-  kRefused,   // the server refused the topic
-  kNoAnswer,  // the server took the connection but did not answer in time
-};
-
-// The client's end of one conversation.
-class ChannelClient {
- public:
-  ~ChannelClient();
-  ChannelOpen Open(const std::string& path, const std::string& topic);
-  // Gives `connection` this conversation.
-  static void Attach(std::unique_ptr<ChannelClient> client, ChannelConnection* connection);
-
- private:
-  friend class ChannelConnection;
-  bool Send(const std::string& message);
-  // The server's answer to the last message: its code, -1 when none came.
-  int Answer(std::string* data);
-  bool Finish();
-  int fd_ = -1;
-};
-
-// Longest wait of a later start for any one answer of the server.  It
-// answers at once when idle; dozens of starts at once on a busy machine
-// queue up behind each other for a few seconds; longer means it is stuck.
-constexpr int kChannelAnswerMs = 5000;

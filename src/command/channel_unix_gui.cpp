@@ -350,73 +350,6 @@ void ChannelServer::Forget(ChannelConnection* connection) {
 }
 
 // ---------------------------------------------------------------------------
-// Client
-
-ChannelClient::~ChannelClient() { CloseSocket(fd_); }
-
-ChannelOpen ChannelClient::Open(const std::string& path, const std::string& topic) {
-  bool refused = false;
-  std::string error;
-  fd_ = ConnectTo(path, &refused, &error);
-  if (fd_ < 0) return refused ? ChannelOpen::kNoServer : ChannelOpen::kNoAnswer;
-  if (!Send(Code(wire::kConnect) + wire::Name(topic))) return ChannelOpen::kNoAnswer;
-  std::string data;
-  const int answer = Answer(&data);
-  if (answer == wire::kConnect) return ChannelOpen::kOpened;
-  return answer == wire::kFail ? ChannelOpen::kRefused : ChannelOpen::kNoAnswer;
-}
-
-void ChannelClient::Attach(std::unique_ptr<ChannelClient> client, ChannelConnection* connection) {
-  connection->client_ = std::move(client);
-}
-
-bool ChannelClient::Send(const std::string& message) {
-  return fd_ >= 0 && WriteAll(fd_, message, kChannelAnswerMs);
-}
-
-int ChannelClient::Answer(std::string* data) {
-  std::string arrived;
-  const auto deadline = Clock::now() + milliseconds(kChannelAnswerMs);
-  for (;;) {
-    std::size_t used = 0;
-    wire::Message m;
-    std::string error;
-    if (!arrived.empty()) {
-      const wire::Parse parse = wire::TakeMessage(arrived, true, &used, &m, &error);
-      if (parse == wire::Parse::kBad) return -1;
-      if (parse == wire::Parse::kComplete) {
-        *data = std::move(m.data);
-        return m.code;
-      }
-    }
-    const auto left = std::chrono::duration_cast<milliseconds>(deadline - Clock::now()).count();
-    if (left <= 0 || WaitReadable(fd_, static_cast<int>(left)) != 1) return -1;
-    char buffer[512];
-    const long got = ReadArrived(fd_, buffer, sizeof buffer);
-    if (got == 0 || got == -2) return -1;
-    if (got > 0) arrived.append(buffer, static_cast<std::size_t>(got));
-  }
-}
-
-// The server reads a conversation in order and closes it at its end
-// message, after answering a failure of anything before: an end with no
-// failure means all of it was taken.
-bool ChannelClient::Finish() {
-  if (!Send(Code(wire::kDisconnect))) return false;
-  EndSending(fd_);
-  const auto deadline = Clock::now() + milliseconds(kChannelAnswerMs);
-  for (bool failed = false;;) {
-    const auto left = std::chrono::duration_cast<milliseconds>(deadline - Clock::now()).count();
-    if (left <= 0 || WaitReadable(fd_, static_cast<int>(left)) != 1) return false;
-    char buffer[64];
-    const long got = ReadArrived(fd_, buffer, sizeof buffer);
-    if (got == 0) return !failed;
-    if (got == -2) return false;
-    for (long i = 0; i < got; ++i) failed = failed || buffer[i] == static_cast<char>(wire::kFail);
-  }
-}
-
-// ---------------------------------------------------------------------------
 // Connection operations over the transport
 
 ChannelConnection::~ChannelConnection() {
@@ -426,53 +359,17 @@ ChannelConnection::~ChannelConnection() {
   SetConnected(false);
 }
 
-const void* ChannelConnection::Request(const wxString& item, size_t* size, wxIPCFormat format) {
-  const wxScopedCharBuffer name = item.utf8_str();
-  if (!client_ || !client_->Send(Code(wire::kRequest) + wire::Name(name.data()) + Code(format)) ||
-      client_->Answer(&reply_) != wire::kRequestReply)
-    return nullptr;
-  if (size != nullptr) *size = reply_.size();
-  return reply_.data();
-}
-
-bool ChannelConnection::StartAdvise(const wxString& item) {
-  const wxScopedCharBuffer name = item.utf8_str();
-  std::string data;
-  return client_ && client_->Send(Code(wire::kAdviseStart) + wire::Name(name.data())) &&
-         client_->Answer(&data) == wire::kAdviseStart;
-}
-
-bool ChannelConnection::StopAdvise(const wxString& item) {
-  const wxScopedCharBuffer name = item.utf8_str();
-  std::string data;
-  return client_ && client_->Send(Code(wire::kAdviseStop) + wire::Name(name.data())) &&
-         client_->Answer(&data) == wire::kAdviseStop;
-}
-
+// A connection here is always the server's end: a later start talks to the
+// server without the toolkit (command/forward.cpp).  Only advice and the
+// end of a conversation go from this end.
 bool ChannelConnection::Disconnect() {
   if (!GetConnected()) return true;
   SetConnected(false);
-  if (client_) {
-    delivered_ = client_->Finish();
-    client_.reset();
-  } else if (server_ != nullptr) {
+  if (server_ != nullptr) {
     server_->Advise(this, Code(wire::kDisconnect));
     server_->Forget(this);
   }
   return true;
-}
-
-bool ChannelConnection::DoExecute(const void* data, size_t size, wxIPCFormat format) {
-  return client_ && size <= wire::kMaxDataBytes &&
-         client_->Send(Code(wire::kExecute) + Code(format) + wire::Data(data, size));
-}
-
-bool ChannelConnection::DoPoke(const wxString& item, const void* data, size_t size,
-                               wxIPCFormat format) {
-  const wxScopedCharBuffer name = item.utf8_str();
-  return client_ && size <= wire::kMaxDataBytes &&
-         client_->Send(Code(wire::kPoke) + wire::Name(name.data()) + Code(format) +
-                       wire::Data(data, size));
 }
 
 bool ChannelConnection::DoAdvise(const wxString& item, const void* data, size_t size,

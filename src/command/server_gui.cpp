@@ -17,9 +17,6 @@
 #include "text/wxtext_gui.h"
 #include "trovlib/trovlib.h"
 
-const char* const kCommandService = "Lomari.DDE.Docuvane";
-const char* const kCommandTopic = "CommandLine";
-
 namespace {
 
 // The command line's own bound (its buffer holds 1023 bytes and the NUL).
@@ -90,16 +87,6 @@ bool RunOrDefer(const std::string& command) {
 void SetCommandRunner(CommandRunner runner) { g_runner = std::move(runner); }
 
 std::size_t DeferredCommandCount() { return g_deferred.size(); }
-
-std::string CommandSocketPath() {
-  std::string error;
-  const std::string dir = RuntimeDirectory(&error);
-  if (dir.empty()) {
-    TrovMessage("ERROR: RuntimeDirectory ", error.c_str(), 5);
-    return std::string();
-  }
-  return dir + "/" + kCommandService;
-}
 
 // ---------------------------------------------------------------------------
 

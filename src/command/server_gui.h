@@ -11,6 +11,7 @@
 #include <string>
 
 #include "command/channel_gui.h"
+#include "command/channel_names.h"
 
 class MyServer;
 
@@ -66,14 +67,6 @@ class MyServer : public wxServer {
   std::set<MyConnection*> connections_;
   std::unique_ptr<ChannelServer> channel_;
 };
-
-// The service name that messages carry.
-extern const char* const kCommandService;  // "Lomari.DDE.Docuvane"
-extern const char* const kCommandTopic;    // "CommandLine"
-
-// "<runtime directory>/Lomari.DDE.Docuvane", or empty (with an "ERROR: "
-// message) when the runtime directory is refused: the channel is off.
-std::string CommandSocketPath();
 
 // Starts the server on CommandSocketPath(); NULL when it cannot.
 MyServer* StartCommandServer();

@@ -60,6 +60,9 @@ bool RemoveFile(const std::string& path);
 // The user's home directory ($HOME, else the password database, else /tmp).
 std::string HomeDirectory();
 
+// The user's login name from the password database, or "".
+std::string UserName();
+
 // Random access to a file held open, or to bytes held in memory.
 class RandomAccessFile {
  public:

@@ -141,6 +141,11 @@ std::string HomeDirectory() {
   return "/tmp";
 }
 
+std::string UserName() {
+  const passwd* pw = getpwuid(getuid());
+  return pw != nullptr && pw->pw_name != nullptr ? pw->pw_name : "";
+}
+
 RandomAccessFile::~RandomAccessFile() { Close(); }
 
 bool RandomAccessFile::Open(const std::string& path) {

@@ -17,8 +17,8 @@
 #include "base/settings.h"
 #include "base/trace.h"
 #include "catalogue/documents.h"
-#include "command/client_gui.h"
 #include "command/command.h"
+#include "command/later_start.h"
 #include "command/server_gui.h"
 #include "platform/instance_lock.h"
 #include "platform/native_window_gui.h"
@@ -36,64 +36,12 @@ namespace {
 
 const char* const kWindowName = "Docuvane";
 
-// How a later start ends: the framework's failure status (-1) when its
-// command reached the running instance, otherwise one a script can tell.
-constexpr unsigned kDeliveredStatus = 255;
-constexpr unsigned kNotDeliveredStatus = 1;
-constexpr unsigned kChannelOffStatus = 2;
-
 void Phase(const char* phase) { TraceMessage("Docuvane::OnInit --- ", phase); }
 
 // The instance lock, taken in main before the toolkit starts: the running
 // instance can then set work going that needs no toolkit while the toolkit
 // loads.  OnInit takes it over.
 std::unique_ptr<InstanceLock> g_earlyLock;
-
-std::unique_ptr<InstanceLock> TakeInstanceLock() {
-  const std::string user = wxGetUserId().ToStdString();
-  char lockName[256];
-  std::snprintf(lockName, sizeof lockName, "Lomari-Docuvane-%s", user.c_str());
-  std::unique_ptr<InstanceLock> lock(new InstanceLock);
-  lock->Create(lockName);
-  if (!lock->error().empty()) TrovMessage("ERROR: InstanceLock ", lock->error().c_str(), 5);
-  return lock;
-}
-
-// A later start: raises the running instance's window, hands it the
-// command line and ends.  Needs neither the toolkit nor a display of its
-// own beyond the X11 connection that raising uses.
-[[noreturn]] void ForwardAndEnd(int argc, const wchar_t* const* argv) {
-  if (const NativeWindow window = TrovLookupWindow(kWindowName)) {
-    if (IsIconic(window)) OpenIcon(window);
-    BringWindowToTop(window);
-    SetForegroundWindow(window);
-  }
-  const char* const command = Command_Line(argc, argv);
-  unsigned status = kDeliveredStatus;
-  const std::string socketPath = CommandSocketPath();
-  if (socketPath.empty()) {
-    // The running instance cannot serve a channel here either; a second
-    // window would be a second instance.
-    TrovMessage("ERROR: MyApp::OnInit ",
-                (std::string("command channel off, command not delivered: ") + command).c_str(), 5);
-    status = kChannelOffStatus;
-  } else {
-    bool delivered = false;
-    SendCommand(command, socketPath, &delivered);
-    if (!delivered) {
-      TrovMessage(
-          "ERROR: MyApp::OnInit ",
-          (std::string("command not delivered to the running instance: ") + command).c_str(), 5);
-      status = kNotDeliveredStatus;
-    }
-  }
-  // The framework's own way out (OnInit returning false) would tear the
-  // toolkit down, and that teardown loads the toolkit's themes first: it
-  // would cost a later start more than all it has done.  The outcome is the
-  // same without it.
-  std::fflush(nullptr);
-  ExitProcess(status);
-}
 
 }  // namespace
 
@@ -200,13 +148,9 @@ int main(int argc, char** argv) {
   Phase("Start");
   g_earlyLock = TakeInstanceLock();
   if (g_earlyLock->IsAnotherRunning()) {
-    // The arguments as the framework would hand them over: wide strings in
-    // the user's locale, which the toolkit would have set by now.
-    std::setlocale(LC_ALL, "");
-    std::vector<wxWCharBuffer> wide;
+    const std::vector<std::wstring> wide = WideArguments(argc, argv);
     std::vector<const wchar_t*> wideArgv;
-    for (int i = 0; i < argc; ++i) wide.push_back(wxString(argv[i], wxConvLocal).wc_str());
-    for (const wxWCharBuffer& arg : wide) wideArgv.push_back(arg.data());
+    for (const std::wstring& arg : wide) wideArgv.push_back(arg.c_str());
     wideArgv.push_back(nullptr);
     ForwardAndEnd(argc, wideArgv.data());
   }

@@ -1,0 +1,22 @@
+// One running instance per user: the lock that says who it is, and what a
+// later start does (raise the instance's window, hand it the command line,
+// end), with no toolkit loaded.
+#pragma once
+
+#include <memory>
+#include <string>
+#include <vector>
+
+#include "platform/instance_lock.h"
+
+// The user's instance lock, taken (or found held by another process).
+std::unique_ptr<InstanceLock> TakeInstanceLock();
+
+// The arguments as the toolkit would hand them over: wide strings read in
+// the user's locale (set here), an argument it cannot read as "".
+std::vector<std::wstring> WideArguments(int argc, char** argv);
+
+// Raises the running instance's window, hands it the command line and ends
+// the process: 255 when the command was delivered, 1 when not, 2 when the
+// command channel is off.
+[[noreturn]] void ForwardAndEnd(int argc, const wchar_t* const* argv);
