@@ -1,11 +1,15 @@
 // A later start handing its command to the running instance: the time from
 // the start to the instance's trace of the processed command, and the later
 // process's own run time, as medians of 50 starts; also when the later
-// start's first trace appears (what loading and starting the toolkit costs
-// before any of the program's own code runs).  Needs a display (run it
-// under tests/run-with-display.sh) and the program built beside it.
+// start's first trace appears (what loading the program costs before any of
+// its own code runs).  Against it, interleaved, the start-up of a minimal
+// toolkit program to its shown empty frame (bench/empty_frame.cpp).  Needs
+// a display (run it under tests/run-with-display.sh) and the program built
+// beside it.
 #include <benchmark/benchmark.h>
 #include <limits.h>
+#include <spawn.h>
+#include <sys/wait.h>
 #include <unistd.h>
 
 #include <algorithm>
@@ -49,6 +53,25 @@ std::string ReadFrom(const std::string& path, std::size_t* offset) {
   return more;
 }
 
+// Spawn to the painted empty frame in ms, -1 when it failed.
+double EmptyFrameStartup(const std::string& reportFile) {
+  setenv("DOCUVANE_BENCH_REPORT_FILE", reportFile.c_str(), 1);
+  const auto start = Clock::now();
+  char* const args[] = {const_cast<char*>(DOCUVANE_EMPTY_FRAME), nullptr};
+  pid_t pid = 0;
+  if (posix_spawn(&pid, DOCUVANE_EMPTY_FRAME, nullptr, nullptr, args, environ) != 0) return -1;
+  int status = 0;
+  waitpid(pid, &status, 0);
+  unsetenv("DOCUVANE_BENCH_REPORT_FILE");
+  long long shownNs = 0;
+  std::ifstream(reportFile) >> shownNs;
+  std::remove(reportFile.c_str());
+  if (!WIFEXITED(status) || WEXITSTATUS(status) != 0 || shownNs == 0) return -1;
+  return std::chrono::duration<double, std::milli>(
+             Clock::time_point(std::chrono::nanoseconds(shownNs)) - start)
+      .count();
+}
+
 void BM_ForwardedCommand(benchmark::State& state) {
   if (std::getenv("DISPLAY") == nullptr) {
     state.SkipWithError("no display: run under tests/run-with-display.sh");
@@ -60,11 +83,17 @@ void BM_ForwardedCommand(benchmark::State& state) {
     state.SkipWithError("the first instance did not start");
     return;
   }
-  std::vector<double> endToEnd, ownRun, toolkitReady;
+  std::vector<double> endToEnd, ownRun, toolkitReady, emptyFrame;
   std::size_t offset = 0;
   ReadFrom(first.log, &offset);
   for (auto _ : state) {
     for (int i = 0; i < 50; ++i) {
+      const double empty = EmptyFrameStartup(box.root() + "/empty-frame-report");
+      if (empty < 0) {
+        state.SkipWithError("the empty frame program failed");
+        return;
+      }
+      emptyFrame.push_back(empty);
       const std::string word = "bench" + std::to_string(i);
       const std::string trace = "Docuvane: Search Keyword: " + word + "\n";
       std::string seen;
@@ -73,7 +102,7 @@ void BM_ForwardedCommand(benchmark::State& state) {
       double arrived = -1, ended = -1, started = -1;
       while ((arrived < 0 || ended < 0) && Clock::now() - start < std::chrono::seconds(20)) {
         const double now = std::chrono::duration<double, std::milli>(Clock::now() - start).count();
-        // The later start's first trace: the toolkit is up, our own code begins.
+        // The later start's first trace: our own code runs.
         if (started < 0 && std::filesystem::exists(later.log) &&
             std::filesystem::file_size(later.log) > 0)
           started = now;
@@ -96,6 +125,8 @@ void BM_ForwardedCommand(benchmark::State& state) {
   state.counters["end_to_end_median_ms"] = Median(endToEnd);
   state.counters["later_start_median_ms"] = Median(ownRun);
   state.counters["later_first_trace_median_ms"] = Median(toolkitReady);
+  state.counters["empty_frame_median_ms"] = Median(emptyFrame);
+  state.counters["later_start_per_empty_frame"] = Median(ownRun) / Median(emptyFrame);
   first.Stop();
 }
 

@@ -5,7 +5,8 @@
 # program finds it beside its own <prefix>/bin.
 set(DOCUVANE_APP_ID org.lomari.Docuvane)
 
-install(TARGETS docuvane docuvane-mkindex docuvane-mkpdf docuvane-open RUNTIME DESTINATION bin)
+install(TARGETS docuvane docuvane-window docuvane-mkindex docuvane-mkpdf docuvane-open
+        RUNTIME DESTINATION bin)
 install(DIRECTORY "${DOCUVANE_SAMPLE_TEXMF}/" DESTINATION share/docuvane/texmf)
 install(FILES "share/applications/${DOCUVANE_APP_ID}.desktop" DESTINATION share/applications)
 install(FILES "share/metainfo/${DOCUVANE_APP_ID}.metainfo.xml" DESTINATION share/metainfo)

@@ -25,12 +25,13 @@ constexpr unsigned kChannelOffStatus = 2;
 
 }  // namespace
 
-std::unique_ptr<InstanceLock> TakeInstanceLock() {
+std::unique_ptr<InstanceLock> TakeInstanceLock(bool report) {
   char lockName[256];
   std::snprintf(lockName, sizeof lockName, "Lomari-Docuvane-%s", UserName().c_str());
   std::unique_ptr<InstanceLock> lock(new InstanceLock);
   lock->Create(lockName);
-  if (!lock->error().empty()) TrovMessage("ERROR: InstanceLock ", lock->error().c_str(), 5);
+  if (report && !lock->error().empty())
+    TrovMessage("ERROR: InstanceLock ", lock->error().c_str(), 5);
   return lock;
 }
 

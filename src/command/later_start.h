@@ -9,8 +9,9 @@
 
 #include "platform/instance_lock.h"
 
-// The user's instance lock, taken (or found held by another process).
-std::unique_ptr<InstanceLock> TakeInstanceLock();
+// The user's instance lock, taken (or found held by another process); what
+// went wrong with it is reported when `report` is set.
+std::unique_ptr<InstanceLock> TakeInstanceLock(bool report = true);
 
 // The arguments as the toolkit would hand them over: wide strings read in
 // the user's locale (set here), an argument it cannot read as "".
