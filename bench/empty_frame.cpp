@@ -7,11 +7,7 @@
 #include <wx/frame.h>
 #include <wx/init.h>
 
-#include <chrono>
-#include <cstdlib>
-#include <fstream>
-#include <string>
-#include <thread>
+#include "shown_report.h"
 
 namespace {
 
@@ -28,22 +24,7 @@ int main(int, char** argv) {
   int argc = 1;  // the benchmarks' mode argument is not the toolkit's
   if (!wxEntryStart(argc, argv)) return 2;
   wxFrame* frame = new wxFrame(nullptr, wxID_ANY, "Empty");
-  frame->Show();
-  while (!frame->IsShownOnScreen()) {
-    wxYield();
-    std::this_thread::sleep_for(std::chrono::milliseconds(1));
-  }
-  wxYield();  // the first paint
-  if (const char* reportFile = std::getenv("DOCUVANE_BENCH_REPORT_FILE")) {
-    const auto shown = std::chrono::duration_cast<std::chrono::nanoseconds>(
-                           std::chrono::steady_clock::now().time_since_epoch())
-                           .count();
-    std::ifstream status("/proc/self/status");
-    std::string line, peak = "0";
-    while (std::getline(status, line))
-      if (line.rfind("VmHWM:", 0) == 0) peak = line.substr(6);
-    std::ofstream(reportFile) << shown << " " << peak << "\n";
-  }
+  ShowAndReport(frame);
   delete frame;
   wxEntryCleanup();
   return 0;

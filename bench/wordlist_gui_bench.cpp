@@ -42,6 +42,7 @@
 #include "catalogue/keywords.h"
 #include "catalogue/pool.h"
 #include "platform/profile.h"
+#include "shown_report.h"
 #include "test_support.h"
 #include "trovlib/prefetch.h"
 #include "trovlib/trovlib.h"
@@ -198,26 +199,8 @@ int RunChild(int argc, char** argv) {
   Docuvane_Init(OpenInstalledWordIndex);
   Start_Collect_Documents();
   wxFrame* frame = new MyFrame("Lomari Docuvane");
-  frame->Show();
-  while (!frame->IsShownOnScreen()) {
-    wxYield();
-    std::this_thread::sleep_for(std::chrono::milliseconds(1));
-  }
-  wxYield();  // the first paint
-  // For the parent: when the window stood (the clock is the system's
-  // monotonic one, the same in both processes), and the peak resident
-  // memory so far (rusage would count the parent's pages shared before
-  // exec).  What the process does after that is not start-up.
-  if (const char* reportFile = std::getenv("DOCUVANE_BENCH_REPORT_FILE")) {
-    const auto shown =
-        std::chrono::duration_cast<std::chrono::nanoseconds>(Clock::now().time_since_epoch())
-            .count();
-    std::ifstream status("/proc/self/status");
-    std::string line, peak = "0";
-    while (std::getline(status, line))
-      if (line.rfind("VmHWM:", 0) == 0) peak = line.substr(6);
-    std::ofstream(reportFile) << shown << " " << peak << "\n";
-  }
+  // What the process does after the report is not start-up.
+  ShowAndReport(frame);
   delete frame;
   delete wxConfigBase::Set(nullptr);
   wxEntryCleanup();
