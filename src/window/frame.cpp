@@ -25,6 +25,7 @@
 #include "window/panel.h"
 #include "window/qlistbox.h"
 #include "window/scan_dialog.h"
+#include "window/tree_nodes.h"
 #include "wordindex/locate.h"
 #include "wordindex/wordlist.h"
 
@@ -125,7 +126,7 @@ void MyFrame::Reload_Catalogue() {
   // The windows point into the tables: empty them first.
   Docuvane* panel = m_helpPanel;
   if (panel->m_targetList) panel->m_targetList->Clear();
-  if (panel->m_tree) panel->m_tree->DeleteAllItems();
+  if (panel->m_treeNodes) panel->m_treeNodes->Clear();
   if (panel->m_wordList) panel->m_wordList->SetItemCount(0);
   Clear_Tables();
   Docuvane_Init(OpenInstalledWordIndex);

@@ -18,6 +18,7 @@
 #include "trovlib/trovlib.h"
 #include "window/panel.h"
 #include "window/qlistbox.h"
+#include "window/tree_nodes.h"
 #include "wordindex/references.h"
 #include "wordindex/wordindex.h"
 
@@ -52,7 +53,8 @@ void Show_Topic(Docuvane* panel, const char* word, int openIfSingle) {
   panel->m_locationTexts.clear();
   if (panel->m_gotoButton) panel->m_gotoButton->Disable();
   if (HighlightedItem != nullptr) {
-    if (panel->m_tree) panel->m_tree->SetItemBold(wxTreeItemId(HighlightedItem), false);
+    if (panel->m_tree)
+      panel->m_tree->SetItemBold(panel->m_treeNodes->ItemOf(HighlightedItem), false);
     HighlightedItem = nullptr;
   }
 
@@ -91,11 +93,14 @@ void HighlightDocument(Docuvane* panel, const char* text) {
   }
   if (found < 0 || !DocumentTable[found].TreeItem || !panel->m_tree) return;
 
-  const wxTreeItemId item(DocumentTable[found].TreeItem);
+  // Its item is made if its branch was never opened.
+  const wxTreeItemId item = panel->m_treeNodes->ItemOf(DocumentTable[found].TreeItem);
+  if (!item.IsOk()) return;
   panel->m_tree->SelectItem(item);
-  if (HighlightedItem != nullptr) panel->m_tree->SetItemBold(wxTreeItemId(HighlightedItem), false);
+  if (HighlightedItem != nullptr)
+    panel->m_tree->SetItemBold(panel->m_treeNodes->ItemOf(HighlightedItem), false);
   panel->m_tree->SetItemBold(item, true);
-  HighlightedItem = item.GetID();
+  HighlightedItem = DocumentTable[found].TreeItem;
 }
 
 void Docuvane::OnSearch(wxCommandEvent&) {

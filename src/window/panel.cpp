@@ -23,6 +23,7 @@
 #include "window/ids.h"
 #include "window/picture.h"
 #include "window/qlistbox.h"
+#include "window/tree_nodes.h"
 
 namespace {
 
@@ -62,9 +63,10 @@ Docuvane::Docuvane(wxWindow* parent, const wxPoint& pos, const wxSize& size) {
       wxTR_HAS_BUTTONS | wxTR_LINES_AT_ROOT | wxTR_HIDE_ROOT | wxBORDER_STATIC | wxCLIP_CHILDREN,
       wxDefaultValidator, "treeCtrl");
   m_tree->SetBackgroundColour(menuColour);
+  m_treeNodes.reset(new TreeNodes(m_tree));
   // A document's own title, where it has one, as the tool tip of its item.
-  m_tree->Bind(wxEVT_TREE_ITEM_GETTOOLTIP, [](wxTreeEvent& event) {
-    const void* item = event.GetItem().GetID();
+  m_tree->Bind(wxEVT_TREE_ITEM_GETTOOLTIP, [this](wxTreeEvent& event) {
+    const void* item = m_treeNodes->NodeOf(event.GetItem());
     for (int i = 0; item != nullptr && i < DocumentCount; ++i)
       if (DocumentTable[i].TreeItem == item) {
         const std::string title = DocumentTitle(DocumentTable[i]);

@@ -7,6 +7,7 @@
 #include <wx/splitter.h>
 #include <wx/treebase.h>
 
+#include <memory>
 #include <string>
 #include <vector>
 
@@ -16,6 +17,7 @@ class wxSearchCtrl;
 class wxTreeCtrl;
 class wxTreeEvent;
 class QListBox;
+class TreeNodes;
 
 class Docuvane : public wxSplitterWindow {
  public:
@@ -25,6 +27,9 @@ class Docuvane : public wxSplitterWindow {
 
   // Child windows, owned by the framework; any of them may be absent.
   wxTreeCtrl* m_tree = nullptr;
+  // The tree's nodes, which the document table and the tree building hold
+  // (items of the control are made as their parents are expanded).
+  std::unique_ptr<TreeNodes> m_treeNodes;
   wxSearchCtrl* m_search = nullptr;
   QListBox* m_wordList = nullptr;
   wxListBox* m_targetList = nullptr;

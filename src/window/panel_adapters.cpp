@@ -12,6 +12,7 @@
 #include "text/wxtext_gui.h"
 #include "window/panel.h"
 #include "window/qlistbox.h"
+#include "window/tree_nodes.h"
 
 namespace {
 
@@ -40,46 +41,26 @@ class PanelCommands : public CommandPanel {
   Docuvane* panel_;
 };
 
-// Tree items travel through the building code as wxTreeItemId's own pointer.
+// The tree building code works on the panel's nodes; the control gets its
+// items as they are shown.
 class TreeCtrlView : public DocumentTreeView {
  public:
-  explicit TreeCtrlView(wxTreeCtrl* tree) : tree_(tree) {}
+  TreeCtrlView(wxTreeCtrl* tree, TreeNodes* nodes) : tree_(tree), nodes_(nodes) {}
   void Freeze() override { tree_->Freeze(); }
   void Thaw() override { tree_->Thaw(); }
-  void DeleteAllItems() override {
-    tree_->DeleteAllItems();
-    Texts().clear();
-  }
-  Item GetRootItem() override { return tree_->GetRootItem().GetID(); }
-  Item AddRoot(const std::string& text) override { return Keep(tree_->AddRoot(ToWx(text)), text); }
+  void DeleteAllItems() override { nodes_->Clear(); }
+  Item GetRootItem() override { return nodes_->Root(); }
+  Item AddRoot(const std::string& text) override { return nodes_->AddRoot(text); }
   Item AppendItem(Item parent, const std::string& text) override {
-    return Keep(tree_->AppendItem(wxTreeItemId(parent), ToWx(text)), text);
+    return nodes_->Append(parent, text);
   }
-  Item GetFirstChild(Item parent) override {
-    wxTreeItemIdValue cookie;
-    return tree_->GetFirstChild(wxTreeItemId(parent), cookie).GetID();
-  }
-  Item GetNextChild(Item, Item previous) override {
-    return tree_->GetNextSibling(wxTreeItemId(previous)).GetID();
-  }
-  // The 8-bit text an item was made with, exactly: its display string read
-  // back may differ when the locale cannot read every byte.
-  std::string GetItemText(Item item) override {
-    const auto kept = Texts().find(item);
-    if (kept != Texts().end()) return kept->second;
-    return FromWx(tree_->GetItemText(wxTreeItemId(item)));
-  }
+  Item GetFirstChild(Item parent) override { return nodes_->FirstChild(parent); }
+  Item GetNextChild(Item, Item previous) override { return nodes_->NextSibling(previous); }
+  std::string GetItemText(Item item) override { return nodes_->Text(item); }
 
  private:
-  static std::unordered_map<Item, std::string>& Texts() {
-    static std::unordered_map<Item, std::string> texts;
-    return texts;
-  }
-  static Item Keep(const wxTreeItemId& id, const std::string& text) {
-    if (id.IsOk()) Texts()[id.GetID()] = text;
-    return id.GetID();
-  }
   wxTreeCtrl* tree_;
+  TreeNodes* nodes_;
 };
 
 }  // namespace
@@ -94,6 +75,6 @@ int Fill_Tree(Docuvane* panel) {
   if (!panel || !panel->m_tree) return 0;
   // Rebuilding deletes every item, the bold one too.
   HighlightedItem = nullptr;
-  TreeCtrlView view(panel->m_tree);
+  TreeCtrlView view(panel->m_tree, panel->m_treeNodes.get());
   return Fill_Tree(view);
 }

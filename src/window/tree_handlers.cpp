@@ -6,6 +6,7 @@
 #include "access/tree_activation.h"
 #include "trovlib/trovlib.h"
 #include "window/panel.h"
+#include "window/tree_nodes.h"
 
 void Docuvane::OnTreeActivate(wxTreeEvent& event) {
   TrovMessage("INFO: Docuvane::OnTreeActivate ", "", 3);
@@ -31,5 +32,6 @@ int Docuvane::Open_Document(const wxTreeItemId& item) {
   // The table lookup, the traces and the opening live in OpenTreeDocument,
   // which refuses an invalid item with its own message.
   DesktopAccessServices services(this);
-  return OpenTreeDocument(services, item.IsOk() ? item.GetID() : nullptr);
+  return OpenTreeDocument(services,
+                          item.IsOk() && m_treeNodes ? m_treeNodes->NodeOf(item) : nullptr);
 }

@@ -17,6 +17,7 @@
 #include "window/about.h"
 #include "window/ids.h"
 #include "window/qlistbox.h"
+#include "window/tree_nodes.h"
 
 namespace gui_testing {
 namespace {
@@ -60,13 +61,15 @@ class LookupTest : public WindowTest {
     for (const wxString& s : p->m_targetList->GetStrings()) items.push_back(s.utf8_string());
     return items;
   }
-  // The tree's items in outline order, with the text indented two blanks a level.
+  // The tree's items in outline order, with the text indented two blanks a
+  // level; the items of branches never opened are made on the way.
   std::vector<std::pair<std::string, wxTreeItemId>> Items(wxTreeItemId parent = {}, int depth = 0) {
     std::vector<std::pair<std::string, wxTreeItemId>> items;
     wxTreeItemIdValue cookie;
     for (wxTreeItemId c =
              p->m_tree->GetFirstChild(parent.IsOk() ? parent : p->m_tree->GetRootItem(), cookie);
          c.IsOk(); c = p->m_tree->GetNextSibling(c)) {
+      p->m_treeNodes->ItemOf(p->m_treeNodes->FirstChild(p->m_treeNodes->NodeOf(c)));
       items.emplace_back(std::string(2 * depth, ' ') + p->m_tree->GetItemText(c).utf8_string(), c);
       for (auto& below : Items(c, depth + 1)) items.push_back(below);
     }
@@ -97,6 +100,15 @@ class LookupTest : public WindowTest {
 };
 
 TEST_F(LookupTest, ShowsCatalogueTreeWordListAndCounts) {
+  // At first only the first level has items; a branch gets its own when it
+  // is opened.
+  wxTreeItemIdValue cookie;
+  const wxTreeItemId manuals = p->m_tree->GetFirstChild(p->m_tree->GetRootItem(), cookie);
+  ASSERT_EQ(p->m_tree->GetItemText(manuals), "Manuals");
+  EXPECT_TRUE(p->m_tree->ItemHasChildren(manuals));
+  EXPECT_EQ(p->m_tree->GetChildrenCount(manuals, false), 0u);
+  p->m_tree->Expand(manuals);
+  EXPECT_EQ(p->m_tree->GetChildrenCount(manuals, false), 2u) << "LaTeX and Fonts";
   // Categories in table order; labels follow under nodes named after their directories.
   std::string outline;
   for (const auto& [indented, id] : Items()) outline += indented + "\n";
@@ -156,7 +168,7 @@ TEST_F(LookupTest, ALocationIsBoldedInTheTreeAndOpensThroughTheTemplate) {
   HighlightDocument(p, "other.pdf#page=1");
   EXPECT_FALSE((HighlightedItem != nullptr)) << "a document the table does not know";
   HighlightDocument(p, "LATEX/Base/Sample.PDF");  // no '#': the whole text, case ignored
-  ASSERT_EQ(HighlightedItem, Item("sample.pdf").GetID());
+  ASSERT_EQ(HighlightedItem, p->m_treeNodes->NodeOf(Item("sample.pdf")));
   EXPECT_TRUE(p->m_tree->IsBold(Item("sample.pdf")));
   Fill_Tree(p);  // deletes the bold item: the next lookup must not touch it
   EXPECT_FALSE((HighlightedItem != nullptr));
