@@ -2,6 +2,8 @@
 #include <gtest/gtest.h>
 
 #include <algorithm>
+#include <map>
+#include <random>
 #include <sstream>
 #include <tuple>
 
@@ -225,6 +227,28 @@ TEST_F(WordIndexTest, WordListOrderCountersAndSearch) {
   };
   for (const auto& [text, exact, expected] : rows)
     EXPECT_EQ(FindWordInList(data.Words, text, exact), expected) << text << " " << exact;
+
+  // Many words, with marks, cases, short ones and long shared leads: in the
+  // list's order, and equal words in the order they came.
+  std::mt19937 random(7);
+  std::vector<std::string> texts;
+  const char* const leads[] = {"", "\\", "{"};
+  for (int i = 0; i < 20000; ++i) {
+    std::string w = leads[random() % 3];
+    if (random() % 4 == 0) w += "definitely";  // shares more than eight bytes
+    for (int n = random() % 12; n >= 0; --n) w += "aAbB_:z\xe9"[random() % 8];
+    texts.push_back(w);
+  }
+  std::vector<const char*> sorted;
+  std::map<const char*, std::size_t> came;
+  for (const std::string& t : texts) came[t.c_str()] = came.size(), sorted.push_back(t.c_str());
+  SortIndexWords(sorted);
+  for (std::size_t i = 1; i < sorted.size(); ++i) {
+    const int order = CompareIndexWords(sorted[i - 1], sorted[i]);
+    ASSERT_LE(order, 0) << sorted[i - 1] << " before " << sorted[i];
+    if (order == 0)
+      ASSERT_LT(came[sorted[i - 1]], came[sorted[i]]) << "equal words keep their order";
+  }
 }
 
 }  // namespace
