@@ -52,6 +52,7 @@
 #include "wordindex/index_writer.h"
 #include "wordindex/locate.h"
 #include "wordindex/wordindex.h"
+#include "wordindex/wordlist.h"
 
 namespace {
 
@@ -197,6 +198,7 @@ int RunChild(int argc, char** argv) {
   wxInitAllImageHandlers();
   wxConfigBase::Get();
   Docuvane_Init(OpenInstalledWordIndex);
+  Start_Fill_WordIndex();
   Start_Collect_Documents();
   wxFrame* frame = new MyFrame("Lomari Docuvane");
   // What the process does after the report is not start-up.

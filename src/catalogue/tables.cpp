@@ -13,6 +13,7 @@
 
 void Clear_Tables() {
   Finish_Started_Collection();
+  Drop_Started_Fill();
   for (int i = 0; i < DocumentCount; ++i) DocumentTable[i] = DocumentEntry{};
   DocumentCount = 0;
   KeywordListReset();

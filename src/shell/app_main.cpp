@@ -31,6 +31,7 @@
 #include "window/frame.h"
 #include "window/panel.h"
 #include "wordindex/locate.h"
+#include "wordindex/wordlist.h"
 
 namespace {
 
@@ -89,7 +90,9 @@ bool MyApp::OnInit() {
   const std::string commandLine = Command_Line(argc, argv);
 
   Docuvane_Init(OpenInstalledWordIndex);
-  // The INI file's documents are read while the window is being built.
+  // The word list and the INI file's documents are read while the window
+  // is being built.
+  Start_Fill_WordIndex();
   Start_Collect_Documents();
 
   Phase("Frame ...");

@@ -33,9 +33,11 @@ QListBox::QListBox(wxWindow* parent, wxWindowID id, const wxPoint& pos, const wx
 
 bool QListBox::Create(wxWindow* parent, wxWindowID id, const wxPoint& pos, const wxSize& size) {
   // The count is known at once; the order only when a row is first read,
-  // so the sort runs beside the rest of the window's construction.
-  Fill_WordIndex(Data, true);
-  WordCount = static_cast<int>(Data.Words.size());
+  // so the sort runs beside the rest of the window's construction.  A fill
+  // started before the toolkit is taken over.
+  const int started = Take_Started_Fill(Data);
+  if (started < 0) Fill_WordIndex(Data, true);
+  WordCount = started >= 0 ? started : static_cast<int>(Data.Words.size());
   const bool created = wxVListBox::Create(parent, id, pos, size, 0, wxVListBoxNameStr);
   SetItemCount(static_cast<size_t>(WordCount));
   MeasureRowHeight();

@@ -5,11 +5,14 @@
 #include <cstdint>
 #include <cstdio>
 #include <cstring>
+#include <future>
+#include <memory>
 #include <utility>
 
 #include "base/trace.h"
 #include "platform/winapi.h"
 #include "text/text.h"
+#include "trovlib/trovlib.h"
 #include "wordindex/wordindex.h"
 
 int CommandWordCount = 0;
@@ -146,6 +149,52 @@ int Fill_WordIndex(WordListData& data, bool sortInBackground) {
   snprintf(elapsed, sizeof elapsed, "%d ms", static_cast<int>(GetTickCount() - start));
   TraceMessage("QListBox::Fill_WordIndex Time: ", elapsed);
   return 1;
+}
+
+namespace {
+
+struct StartedFill {
+  std::shared_ptr<WordListData> data;  // its sort may still run
+  std::vector<TrovHeldMessage> held;
+  int count = 0;
+};
+
+std::future<StartedFill> g_started;
+
+}  // namespace
+
+void Start_Fill_WordIndex() {
+  if (g_started.valid()) return;
+  g_started = std::async(std::launch::async, [] {
+    StartedFill fill;
+    fill.data = std::make_shared<WordListData>();
+    TrovHoldMessages(&fill.held);
+    Fill_WordIndex(*fill.data, true);
+    TrovHoldMessages(nullptr);
+    fill.count = static_cast<int>(fill.data->Words.size());
+    return fill;
+  });
+}
+
+int Take_Started_Fill(WordListData& data) {
+  if (!g_started.valid()) return -1;
+  StartedFill fill = g_started.get();
+  TrovReplayMessages(fill.held);
+  data.Wait();
+  data.Words.clear();
+  data.RecordBuffer.reset();
+  // The words move over once their sort has ended, on the first Wait().
+  std::shared_ptr<WordListData> source = fill.data;
+  data.Sorting = std::async(std::launch::deferred, [&data, source] {
+    source->Wait();
+    data.Words = std::move(source->Words);
+    data.RecordBuffer = std::move(source->RecordBuffer);
+  });
+  return fill.count;
+}
+
+void Drop_Started_Fill() {
+  if (g_started.valid()) g_started.get().data->Wait();
 }
 
 int FindWordInList(const std::vector<const char*>& words, const char* text, int exact) {

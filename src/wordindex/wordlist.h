@@ -26,6 +26,20 @@ struct WordListData {
 // sorted on a worker thread: data.Wait() before reading data.Words.
 int Fill_WordIndex(WordListData& data, bool sortInBackground = false);
 
+// Begins Fill_WordIndex for the open word index on a thread of its own, so
+// that reading and counting the words overlaps with the toolkit's start;
+// its messages are held back until Take_Started_Fill writes them.  Nothing
+// may read the word index file, or close it, until then.
+void Start_Fill_WordIndex();
+
+// When a fill was started: waits until its words are read and counted,
+// writes its messages and gives `data` the words (in the list's order once
+// data.Wait() returns); the number of words, or -1 when none was started.
+int Take_Started_Fill(WordListData& data);
+
+// Waits for a started fill that nobody took, and drops it.
+void Drop_Started_Fill();
+
 // Sorts words into the list's order (CompareIndexWords).
 void SortIndexWords(std::vector<const char*>& words);
 

@@ -2,9 +2,11 @@
 #include <gtest/gtest.h>
 
 #include <algorithm>
+#include <chrono>
 #include <map>
 #include <random>
 #include <sstream>
+#include <thread>
 #include <tuple>
 
 #include "fuzz/wordindex_target.h"
@@ -228,6 +230,22 @@ TEST_F(WordIndexTest, WordListOrderCountersAndSearch) {
   for (const auto& [text, exact, expected] : rows)
     EXPECT_EQ(FindWordInList(data.Words, text, exact), expected) << text << " " << exact;
 
+  // Started ahead on a thread of its own and taken over: the same words in
+  // the same order, the same counters, its messages written when taken.
+  messages.clear();
+  CommandWordCount = EnvironmentWordCount = 0;
+  Start_Fill_WordIndex();
+  std::this_thread::sleep_for(std::chrono::milliseconds(50));
+  EXPECT_FALSE(messages.Contains("Skipped index word")) << "held back until taken";
+  WordListData ahead;
+  EXPECT_EQ(Take_Started_Fill(ahead), int(order.size()));
+  EXPECT_TRUE(messages.Contains("Skipped index word: \\@ifnextchar"));
+  EXPECT_EQ(CommandWordCount, 3);
+  EXPECT_EQ(EnvironmentWordCount, 2);
+  ahead.Wait();
+  EXPECT_EQ(std::vector<std::string>(ahead.Words.begin(), ahead.Words.end()), order);
+  EXPECT_EQ(Take_Started_Fill(ahead), -1) << "taken once";
+
   // Many words, with marks, cases, short ones and long shared leads: in the
   // list's order, and equal words in the order they came.
   std::mt19937 random(7);
@@ -244,10 +262,11 @@ TEST_F(WordIndexTest, WordListOrderCountersAndSearch) {
   for (const std::string& t : texts) came[t.c_str()] = came.size(), sorted.push_back(t.c_str());
   SortIndexWords(sorted);
   for (std::size_t i = 1; i < sorted.size(); ++i) {
-    const int order = CompareIndexWords(sorted[i - 1], sorted[i]);
-    ASSERT_LE(order, 0) << sorted[i - 1] << " before " << sorted[i];
-    if (order == 0)
+    const int compared = CompareIndexWords(sorted[i - 1], sorted[i]);
+    ASSERT_LE(compared, 0) << sorted[i - 1] << " before " << sorted[i];
+    if (compared == 0) {
       ASSERT_LT(came[sorted[i - 1]], came[sorted[i]]) << "equal words keep their order";
+    }
   }
 }
 
