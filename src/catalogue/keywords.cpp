@@ -2,6 +2,8 @@
 #include "catalogue/keywords.h"
 
 #include <cstring>
+#include <iterator>
+#include <map>
 #include <memory>
 #include <new>
 #include <string>
@@ -24,11 +26,14 @@ constexpr std::size_t kFileNameBufferSize = 128;
 
 char g_emptyKeyword[1] = {'\0'};
 
-// Where the last keyword was found or inserted.  Keys of one file usually
-// come sorted, so walking on from here instead of from the head keeps
-// loading close to linear.  Nodes are never removed, so it stays valid
-// until the list is reset.
-KeywordNode* g_lastNode = nullptr;
+// Every node of the list by its folded keyword, the head under "": the
+// place of a new keyword is found without walking the list, whatever order
+// the keywords come in.  Nodes are never removed, so it stays valid until
+// the list is reset.
+std::map<std::string, KeywordNode*>& NodesByKeyword() {
+  static std::map<std::string, KeywordNode*> nodes;
+  return nodes;
+}
 
 int HexValue(unsigned char c) {
   if (c >= '0' && c <= '9') return c - '0';
@@ -167,33 +172,22 @@ std::vector<const char*> SplitKeyList(const char* list, unsigned long length, un
 }
 
 void AddKeywordTarget(const char* keyword, const char* anchor, int documentIndex) {
-  KeywordNode* previous = &KeywordListHead;
-  KeywordNode* current = &KeywordListHead;
-  if (g_lastNode != nullptr && CompareIgnoringCase(g_lastNode->Keyword, keyword) <= 0)
-    previous = current = g_lastNode;
-
-  KeywordNode* node = nullptr;
-  while (current != &KeywordListEnd) {
-    const int order = CompareIgnoringCase(current->Keyword, keyword);
-    if (order == 0) {
-      node = current;
-      break;
-    }
-    if (order > 0) break;
-    previous = current;
-    current = current->Next;
-    if (current == nullptr) return;  // a broken list: add nothing
-  }
-
+  auto& nodes = NodesByKeyword();
+  if (nodes.empty()) nodes.emplace(std::string(), &KeywordListHead);
+  std::string folded = Folded(keyword);
+  // The node of this keyword, or the last one before it.
+  auto at = nodes.lower_bound(folded);
+  KeywordNode* node = at != nodes.end() && at->first == folded ? at->second : nullptr;
   if (node == nullptr) {
+    KeywordNode* previous = std::prev(at)->second;
     void* memory = PoolAlloc(1, static_cast<int>(sizeof(KeywordNode)));
     if (memory == nullptr) return;  // the pool has said why
     char* copy = PoolCopy(keyword);
     if (copy == nullptr) return;
-    node = new (memory) KeywordNode{current, copy, nullptr};
+    node = new (memory) KeywordNode{previous->Next, copy, nullptr};
     previous->Next = node;
+    nodes.emplace_hint(at, std::move(folded), node);
   }
-  g_lastNode = node;
 
   void* memory = PoolAlloc(1, static_cast<int>(sizeof(KeywordTarget)));
   if (memory == nullptr) return;
@@ -205,5 +199,5 @@ void AddKeywordTarget(const char* keyword, const char* anchor, int documentIndex
 void KeywordListReset() {
   KeywordListHead.Next = &KeywordListEnd;
   KeywordListHead.Targets = nullptr;
-  g_lastNode = nullptr;
+  NodesByKeyword().clear();
 }

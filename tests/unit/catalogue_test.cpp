@@ -16,6 +16,7 @@
 #include "catalogue/tree.h"
 #include "platform/profile.h"
 #include "test_support.h"
+#include "text/text.h"
 #include "wordindex/wordindex.h"
 
 namespace {
@@ -257,6 +258,25 @@ TEST_F(CatalogueTest, PoolKeysAndTheKeywordList) {
   AddKeywordTarget("\\section", "sec:2", 1);
   EXPECT_EQ(DumpList(), "\\section: sec:2@1 sec:1@0\nBegin: b2@1 b1@0\n");  // bytes after folding
   EXPECT_EQ(FindKeyword("BEGIN"), KeywordListHead.Next->Next);
+
+  // Keywords in any order (and case) end in one sorted list, each once with
+  // all its targets.
+  KeywordListReset(), PoolReset();
+  std::vector<std::string> words;
+  for (int i = 0; i < 3000; ++i) words.push_back("\\w" + std::to_string(i * 7919 % 3000));
+  for (int i = 0; i < 3000; i += 3) words.push_back("\\W" + std::to_string(i));
+  for (std::size_t i = 0; i < words.size(); ++i) AddKeywordTarget(words[i].c_str(), "a", int(i));
+  std::size_t nodes = 0;
+  for (const KeywordNode* n = KeywordListHead.Next; n != &KeywordListEnd; n = n->Next, ++nodes) {
+    if (n->Next != &KeywordListEnd) {
+      ASSERT_LT(CompareIgnoringCase(n->Keyword, n->Next->Keyword), 0);
+    }
+  }
+  EXPECT_EQ(nodes, 3000u);
+  const KeywordNode* w0 = FindKeyword("\\w0");
+  ASSERT_NE(w0, nullptr);
+  EXPECT_EQ(w0->Targets->DocumentIndex, 3000) << "the newest first: \\W0";
+  EXPECT_EQ(w0->Targets->Next->DocumentIndex, 0);
 }
 
 }  // namespace
