@@ -29,43 +29,6 @@ std::string Literal(const std::string& text) {
   return out + ")";
 }
 
-std::string Pdf(const std::string& title, int pages) {
-  std::string pdf = "%PDF-1.4\n%\xE2\xE3\xCF\xD3\n";
-  std::vector<std::size_t> offsets;  // of objects 1..n
-  auto object = [&](const std::string& body) {
-    offsets.push_back(pdf.size());
-    pdf += std::to_string(offsets.size()) + " 0 obj\n" + body + "\nendobj\n";
-  };
-  // 1 catalog, 2 page tree, 3 font, then per page: page object, content.
-  std::string kids;
-  for (int i = 0; i < pages; ++i) kids += (i ? " " : "") + std::to_string(4 + 2 * i) + " 0 R";
-  object("<< /Type /Catalog /Pages 2 0 R >>");
-  object("<< /Type /Pages /Kids [" + kids + "] /Count " + std::to_string(pages) + " >>");
-  object("<< /Type /Font /Subtype /Type1 /BaseFont /Helvetica >>");
-  for (int i = 0; i < pages; ++i) {
-    object(
-        "<< /Type /Page /Parent 2 0 R /MediaBox [0 0 612 792] /Resources << /Font << /F1 3 0 R "
-        ">> >> /Contents " +
-        std::to_string(5 + 2 * i) + " 0 R >>");
-    const std::string content = "BT /F1 24 Tf 72 700 Td " + Literal(title) +
-                                " Tj ET\nBT /F1 12 Tf 72 72 Td " +
-                                Literal("Page " + std::to_string(i + 1)) + " Tj ET\n";
-    object("<< /Length " + std::to_string(content.size()) + " >>\nstream\n" + content +
-           "endstream");
-  }
-  const std::size_t xref = pdf.size();
-  pdf += "xref\n0 " + std::to_string(offsets.size() + 1) + "\n0000000000 65535 f \n";
-  for (std::size_t offset : offsets) {
-    char line[24];
-    snprintf(line, sizeof line, "%010zu 00000 n \n", offset);
-    pdf += line;
-  }
-  pdf += "trailer\n<< /Size " + std::to_string(offsets.size() + 1) +
-         " /Root 1 0 R /Info << /Title " + Literal(title) + " >> >>\nstartxref\n" +
-         std::to_string(xref) + "\n%%EOF\n";
-  return pdf;
-}
-
 struct Link {
   double x1, y1, x2, y2;
   std::string dest;  // a named destination
@@ -83,9 +46,10 @@ std::string Text(double x, double y, const std::string& text) {
 }
 
 // Pages with links to named destinations; `catalog` and `trailer` extend
-// those dictionaries.
+// those dictionaries; the text is set in `font`.
 std::string Document(const std::vector<Page>& pages, const std::string& names,
-                     const std::string& catalog, const std::string& trailer) {
+                     const std::string& catalog, const std::string& trailer,
+                     const std::string& font = "Courier") {
   std::string pdf = "%PDF-1.4\n%\xE2\xE3\xCF\xD3\n";
   std::vector<std::size_t> offsets;
   auto object = [&](const std::string& body) {
@@ -105,7 +69,7 @@ std::string Document(const std::vector<Page>& pages, const std::string& names,
          (dests.empty() ? std::string() : "/Names << /Dests << /Names [" + dests + "] >> >> ") +
          catalog + " >>");
   object("<< /Type /Pages /Kids [" + kids + "] /Count " + std::to_string(pages.size()) + " >>");
-  object("<< /Type /Font /Subtype /Type1 /BaseFont /Courier >>");
+  object("<< /Type /Font /Subtype /Type1 /BaseFont /" + font + " >>");
   for (std::size_t i = 0; i < pages.size(); ++i) {
     std::string annots;
     for (const Link& l : pages[i].links)
@@ -130,6 +94,16 @@ std::string Document(const std::vector<Page>& pages, const std::string& names,
   pdf += "trailer\n<< /Size " + std::to_string(offsets.size() + 1) + " /Root 1 0 R " + trailer +
          " >>\nstartxref\n" + std::to_string(xref) + "\n%%EOF\n";
   return pdf;
+}
+
+// Pages that show a title, and their numbers.
+std::string Pdf(const std::string& title, int count) {
+  std::vector<Page> pages(static_cast<std::size_t>(count));
+  for (int i = 0; i < count; ++i)
+    pages[static_cast<std::size_t>(i)].content =
+        "BT /F1 24 Tf 72 700 Td " + Literal(title) + " Tj ET\nBT /F1 12 Tf 72 72 Td " +
+        Literal("Page " + std::to_string(i + 1)) + " Tj ET\n";
+  return Document(pages, "", "", "/Info << /Title " + Literal(title) + " >>", "Helvetica");
 }
 
 // Six pages labelled i, ii, 1, 2, 3, 4.  Text pages mention commands and

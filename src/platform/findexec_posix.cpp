@@ -3,7 +3,6 @@
 #include <fcntl.h>
 #include <poll.h>
 #include <signal.h>
-#include <spawn.h>
 #include <sys/stat.h>
 #include <sys/wait.h>
 #include <unistd.h>
@@ -15,11 +14,10 @@
 #include <vector>
 
 #include "platform/desktop_entry.h"
+#include "platform/exec.h"
 #include "platform/findexec.h"
 #include "platform/winapi.h"
 #include "text/text.h"
-
-extern char** environ;
 
 namespace {
 
@@ -54,22 +52,8 @@ std::string FindOnPath(const std::string& program) {
 
 bool RunAndCapture(const char* const* argv, std::string& output, int timeoutMs) {
   output.clear();
-  int fds[2];
-  if (pipe2(fds, O_CLOEXEC) != 0) return false;
-
-  posix_spawn_file_actions_t actions;
-  posix_spawn_file_actions_init(&actions);
-  posix_spawn_file_actions_addopen(&actions, 0, "/dev/null", O_RDONLY, 0);
-  posix_spawn_file_actions_adddup2(&actions, fds[1], 1);
-  posix_spawn_file_actions_addopen(&actions, 2, "/dev/null", O_WRONLY, 0);
-  pid_t pid = 0;
-  int rc = posix_spawnp(&pid, argv[0], &actions, nullptr, const_cast<char* const*>(argv), environ);
-  posix_spawn_file_actions_destroy(&actions);
-  close(fds[1]);
-  if (rc != 0) {
-    close(fds[0]);
-    return false;
-  }
+  int pid = 0, fd = -1;
+  if (!SpawnWithOutputPipe(argv, true, &pid, &fd)) return false;
 
   auto deadline = std::chrono::steady_clock::now() + std::chrono::milliseconds(timeoutMs);
   bool timedOut = false;
@@ -82,19 +66,19 @@ bool RunAndCapture(const char* const* argv, std::string& output, int timeoutMs) 
       timedOut = true;
       break;
     }
-    pollfd p{fds[0], POLLIN, 0};
+    pollfd p{fd, POLLIN, 0};
     int ready = poll(&p, 1, static_cast<int>(left));
     if (ready < 0 && errno == EINTR) continue;
     if (ready <= 0) {
       timedOut = ready == 0;
       break;
     }
-    ssize_t got = read(fds[0], buffer, sizeof buffer);
+    ssize_t got = read(fd, buffer, sizeof buffer);
     if (got < 0 && errno == EINTR) continue;
     if (got <= 0) break;
     if (output.size() < kMaxHelperOutput) output.append(buffer, static_cast<std::size_t>(got));
   }
-  close(fds[0]);
+  close(fd);
   if (timedOut) kill(pid, SIGKILL);
   // A helper may close its output and linger: the deadline holds here too.
   int status = 0;

@@ -3,7 +3,6 @@
 #include <fcntl.h>
 #include <poll.h>
 #include <signal.h>
-#include <spawn.h>
 #include <sys/resource.h>
 #include <sys/socket.h>
 #include <sys/wait.h>
@@ -17,9 +16,8 @@
 #include <deque>
 #include <vector>
 
+#include "platform/exec.h"
 #include "platform/worker.h"
-
-extern char** environ;
 
 namespace {
 
@@ -292,23 +290,10 @@ bool StandardErrorIsTerminal() { return isatty(2) == 1; }
 ChildProgram::~ChildProgram() { Stop(); }
 
 bool ChildProgram::Start(const char* const* argv) {
-  int fds[2];
-  if (pipe2(fds, O_CLOEXEC) != 0) return false;
-  posix_spawn_file_actions_t actions;
-  posix_spawn_file_actions_init(&actions);
-  posix_spawn_file_actions_addopen(&actions, 0, "/dev/null", O_RDONLY, 0);
-  posix_spawn_file_actions_adddup2(&actions, fds[1], 1);
-  pid_t pid = 0;
-  const int rc =
-      posix_spawnp(&pid, argv[0], &actions, nullptr, const_cast<char* const*>(argv), environ);
-  posix_spawn_file_actions_destroy(&actions);
-  close(fds[1]);
-  if (rc != 0) {
-    close(fds[0]);
-    return false;
-  }
+  int pid = 0, fd = -1;
+  if (!SpawnWithOutputPipe(argv, false, &pid, &fd)) return false;
   pid_ = pid;
-  fd_ = fds[0];
+  fd_ = fd;
   eof_ = false;
   pending_.clear();
   return true;
