@@ -93,13 +93,11 @@ const PopplerApi* LoadPoppler(std::string& reason) {
   std::call_once(once, [] {
     static DynamicLibrary library;
     if (!library.Open({"libpoppler-glib.so.8"}, &why)) return;
-    api.new_from_file = reinterpret_cast<decltype(api.new_from_file)>(
-        library.Symbol("poppler_document_new_from_file"));
-    api.get_n_pages =
-        reinterpret_cast<decltype(api.get_n_pages)>(library.Symbol("poppler_document_get_n_pages"));
-    api.error_quark =
-        reinterpret_cast<decltype(api.error_quark)>(library.Symbol("poppler_error_quark"));
-    if (!api.new_from_file || !api.get_n_pages || !api.error_quark)
+    std::string missing;
+    library.Take("poppler_document_new_from_file", api.new_from_file, missing);
+    library.Take("poppler_document_get_n_pages", api.get_n_pages, missing);
+    library.Take("poppler_error_quark", api.error_quark, missing);
+    if (!missing.empty())
       why = "libpoppler-glib lacks a function it should have";
     else
       loaded = &api;

@@ -17,6 +17,13 @@ class DynamicLibrary {
   bool Open(const std::vector<std::string>& names, std::string* error);
   // The address of `name`, or nullptr.
   void* Symbol(const char* name) const;
+  // Sets `function` to `name`; when it is missing, adds the name to
+  // `missing` (", " between names).
+  template <typename F>
+  void Take(const char* name, F& function, std::string& missing) const {
+    function = reinterpret_cast<F>(Symbol(name));
+    if (function == nullptr) missing += (missing.empty() ? "" : ", ") + std::string(name);
+  }
 
  private:
   void* handle_ = nullptr;
