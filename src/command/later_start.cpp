@@ -5,6 +5,8 @@
 #include <cstdlib>
 #include <cstring>
 #include <cwchar>
+#include <string>
+#include <vector>
 
 #include "command/channel_names.h"
 #include "command/command.h"
@@ -14,8 +16,6 @@
 #include "trovlib/trovlib.h"
 
 namespace {
-
-const char* const kWindowName = "Docuvane";
 
 // How a later start ends: the framework's failure status (-1) when its
 // command reached the running instance, otherwise one a script can tell.
@@ -35,22 +35,8 @@ std::unique_ptr<InstanceLock> TakeInstanceLock(bool report) {
   return lock;
 }
 
-std::vector<std::wstring> WideArguments(int argc, char** argv) {
-  std::setlocale(LC_ALL, "");
-  std::vector<std::wstring> wide;
-  for (int i = 0; i < argc; ++i) {
-    std::mbstate_t state{};
-    const char* from = argv[i];
-    std::wstring arg(std::strlen(argv[i]) + 1, L'\0');
-    const std::size_t n = std::mbsrtowcs(&arg[0], &from, arg.size(), &state);
-    arg.resize(n == static_cast<std::size_t>(-1) ? 0 : n);
-    wide.push_back(arg);
-  }
-  return wide;
-}
-
 void ForwardAndEnd(int argc, const wchar_t* const* argv) {
-  if (const NativeWindow window = TrovLookupWindow(kWindowName)) {
+  if (const NativeWindow window = TrovLookupWindow(kInstanceWindowName)) {
     if (IsIconic(window)) OpenIcon(window);
     BringWindowToTop(window);
     SetForegroundWindow(window);
@@ -76,4 +62,21 @@ void ForwardAndEnd(int argc, const wchar_t* const* argv) {
   }
   std::fflush(nullptr);
   ExitProcess(status);
+}
+
+void ForwardArgumentsAndEnd(int argc, char** argv) {
+  std::setlocale(LC_ALL, "");
+  std::vector<std::wstring> wide;
+  for (int i = 0; i < argc; ++i) {
+    std::mbstate_t state{};
+    const char* from = argv[i];
+    std::wstring arg(std::strlen(argv[i]) + 1, L'\0');
+    const std::size_t n = std::mbsrtowcs(&arg[0], &from, arg.size(), &state);
+    arg.resize(n == static_cast<std::size_t>(-1) ? 0 : n);
+    wide.push_back(arg);
+  }
+  std::vector<const wchar_t*> wideArgv;
+  for (const std::wstring& arg : wide) wideArgv.push_back(arg.c_str());
+  wideArgv.push_back(nullptr);
+  ForwardAndEnd(argc, wideArgv.data());
 }

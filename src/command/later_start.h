@@ -4,20 +4,22 @@
 #pragma once
 
 #include <memory>
-#include <string>
-#include <vector>
 
 #include "platform/instance_lock.h"
+
+// The name the running instance's window is registered under.
+constexpr const char* kInstanceWindowName = "Docuvane";
 
 // The user's instance lock, taken (or found held by another process); what
 // went wrong with it is reported when `report` is set.
 std::unique_ptr<InstanceLock> TakeInstanceLock(bool report = true);
 
-// The arguments as the toolkit would hand them over: wide strings read in
-// the user's locale (set here), an argument it cannot read as "".
-std::vector<std::wstring> WideArguments(int argc, char** argv);
-
 // Raises the running instance's window, hands it the command line and ends
 // the process: 255 when the command was delivered, 1 when not, 2 when the
 // command channel is off.
 [[noreturn]] void ForwardAndEnd(int argc, const wchar_t* const* argv);
+
+// The same from main's arguments, read as the toolkit would hand them over:
+// wide strings in the user's locale (set here), an argument it cannot read
+// as "".
+[[noreturn]] void ForwardArgumentsAndEnd(int argc, char** argv);

@@ -25,11 +25,7 @@ int main(int argc, char** argv) {
     std::unique_ptr<InstanceLock> lock = TakeInstanceLock(false);
     if (lock->IsAnotherRunning()) {
       TraceMessage("Docuvane::OnInit --- ", "Start");
-      const std::vector<std::wstring> wide = WideArguments(argc, argv);
-      std::vector<const wchar_t*> wideArgv;
-      for (const std::wstring& arg : wide) wideArgv.push_back(arg.c_str());
-      wideArgv.push_back(nullptr);
-      ForwardAndEnd(argc, wideArgv.data());
+      ForwardArgumentsAndEnd(argc, argv);
     }
   }
   // The lock is free again for the window program.  Should another start

@@ -35,8 +35,6 @@
 
 namespace {
 
-const char* const kWindowName = "Docuvane";
-
 void Phase(const char* phase) { TraceMessage("Docuvane::OnInit --- ", phase); }
 
 // The instance lock, taken in main before the toolkit starts: the running
@@ -113,7 +111,7 @@ bool MyApp::OnInit() {
   });
 
   const NativeWindow window = NativeWindowOf(frame);
-  TrovPublishWindow(kWindowName, window);
+  TrovPublishWindow(kInstanceWindowName, window);
   char handle[16];
   std::snprintf(handle, sizeof handle, "%d",
                 static_cast<int>(static_cast<std::uint32_t>(window & 0xFFFFFFFFul)));
@@ -151,11 +149,7 @@ int main(int argc, char** argv) {
   Phase("Start");
   g_earlyLock = TakeInstanceLock();
   if (g_earlyLock->IsAnotherRunning()) {
-    const std::vector<std::wstring> wide = WideArguments(argc, argv);
-    std::vector<const wchar_t*> wideArgv;
-    for (const std::wstring& arg : wide) wideArgv.push_back(arg.c_str());
-    wideArgv.push_back(nullptr);
-    ForwardAndEnd(argc, wideArgv.data());
+    ForwardArgumentsAndEnd(argc, argv);
   }
   // The catalogue's first search walks the documentation tree, the panel's
   // first icon the icon trees; as the running instance, have them walked
