@@ -217,35 +217,62 @@ std::string SelfPath() {
   return buffer;
 }
 
-// Time from spawning one child to its shown window in ms (-1 when it
-// failed), and its peak resident memory up to then in MiB.
-double RunProcess(const std::string& mode, double* peakMiB = nullptr,
-                  const std::string& binary = std::string()) {
-  const auto start = Clock::now();
+// One start of a child process, up to its shown window: the time from its
+// spawning (ms, -1 when it failed), its peak resident memory (MiB) and the
+// processor time of its main thread and of all its threads (ms).
+struct Start {
+  double ms = -1, peakMiB = 0, mainCpuMs = 0, processCpuMs = 0;
+};
+
+Start RunProcess(const std::string& mode, const std::string& binary = std::string()) {
+  const auto spawned = Clock::now();
   // Spawned, not forked: a forked child would start with this process's
   // resident pages and report them as its peak.
   const std::string self = binary.empty() ? SelfPath() : binary;
   char* const args[] = {const_cast<char*>(self.c_str()), const_cast<char*>(mode.c_str()), nullptr};
   pid_t pid = 0;
-  if (posix_spawn(&pid, self.c_str(), nullptr, nullptr, args, environ) != 0) return -1;
+  Start start;
+  if (posix_spawn(&pid, self.c_str(), nullptr, nullptr, args, environ) != 0) return start;
   int status = 0;
   waitpid(pid, &status, 0);
   std::ifstream in(std::getenv("DOCUVANE_BENCH_REPORT_FILE"));
   long long shownNs = 0;
   double kib = 0;
-  in >> shownNs >> kib;
-  if (peakMiB) *peakMiB = kib / 1024.0;
-  const double ms = std::chrono::duration<double, std::milli>(
-                        Clock::time_point(std::chrono::nanoseconds(shownNs)) - start)
-                        .count();
+  std::string unit;  // "kB"
+  in >> shownNs >> kib >> unit >> start.mainCpuMs >> start.processCpuMs;
+  start.peakMiB = kib / 1024.0;
   std::remove(std::getenv("DOCUVANE_BENCH_REPORT_FILE"));
-  return WIFEXITED(status) && WEXITSTATUS(status) == 0 && shownNs > 0 ? ms : -1;
+  if (WIFEXITED(status) && WEXITSTATUS(status) == 0 && shownNs > 0)
+    start.ms = std::chrono::duration<double, std::milli>(
+                   Clock::time_point(std::chrono::nanoseconds(shownNs)) - spawned)
+                   .count();
+  return start;
 }
 
 double Median(std::vector<double> v) {
   std::sort(v.begin(), v.end());
   return v.empty() ? 0 : v[v.size() / 2];
 }
+
+// The starts of one program, with the medians of each figure as counters
+// named after it.
+struct Starts {
+  std::vector<Start> runs;
+  bool Failed() const {
+    return std::any_of(runs.begin(), runs.end(), [](const Start& s) { return s.ms < 0; });
+  }
+  double Median(double Start::*figure) const {
+    std::vector<double> values;
+    for (const Start& s : runs) values.push_back(s.*figure);
+    return ::Median(values);
+  }
+  void Report(benchmark::State& state, const std::string& name) const {
+    state.counters[name + "_ms"] = Median(&Start::ms);
+    state.counters[name + "_peak_MiB"] = Median(&Start::peakMiB);
+    state.counters[name + "_main_cpu_ms"] = Median(&Start::mainCpuMs);
+    state.counters[name + "_process_cpu_ms"] = Median(&Start::processCpuMs);
+  }
+};
 
 // Starts of the empty frame and of the program, interleaved so that both
 // see the same machine load, with the environment already set.
@@ -256,32 +283,22 @@ void CompareStartups(benchmark::State& state, const std::string& reportFile) {
   // start runs interleaved with ours: before and after in one run.
   const char* baselineEnv = std::getenv("DOCUVANE_BENCH_BASELINE");
   const std::string baseline = baselineEnv ? baselineEnv : "";
-  std::vector<double> empty, docuvane, emptyPeak, docuvanePeak, before, beforePeak;
+  Starts empty, docuvane, before;
   for (auto _ : state) {
     for (int round = 0; round < 9; ++round) {
-      double peak = 0;
-      empty.push_back(RunProcess("--child=empty", &peak, DOCUVANE_EMPTY_FRAME));
-      emptyPeak.push_back(peak);
-      docuvane.push_back(RunProcess("--child=docuvane", &peak));
-      docuvanePeak.push_back(peak);
-      if (!baseline.empty()) {
-        before.push_back(RunProcess("--child=docuvane", &peak, baseline));
-        beforePeak.push_back(peak);
-      }
+      empty.runs.push_back(RunProcess("--child=empty", DOCUVANE_EMPTY_FRAME));
+      docuvane.runs.push_back(RunProcess("--child=docuvane"));
+      if (!baseline.empty()) before.runs.push_back(RunProcess("--child=docuvane", baseline));
     }
   }
-  if (std::count(empty.begin(), empty.end(), -1.0) ||
-      std::count(docuvane.begin(), docuvane.end(), -1.0))
+  if (empty.Failed() || docuvane.Failed())
     state.SkipWithError("a child process failed (no display?)");
-  state.counters["empty_frame_ms"] = Median(empty);
-  state.counters["docuvane_ms"] = Median(docuvane);
-  state.counters["ratio"] = Median(docuvane) / Median(empty);
-  state.counters["empty_peak_MiB"] = Median(emptyPeak);
-  state.counters["docuvane_peak_MiB"] = Median(docuvanePeak);
-  if (!before.empty()) {
-    state.counters["baseline_ms"] = Median(before);
-    state.counters["baseline_ratio"] = Median(before) / Median(empty);
-    state.counters["baseline_peak_MiB"] = Median(beforePeak);
+  empty.Report(state, "empty_frame");
+  docuvane.Report(state, "docuvane");
+  state.counters["ratio"] = docuvane.Median(&Start::ms) / empty.Median(&Start::ms);
+  if (!before.runs.empty()) {
+    before.Report(state, "baseline");
+    state.counters["baseline_ratio"] = before.Median(&Start::ms) / empty.Median(&Start::ms);
   }
 }
 
