@@ -41,6 +41,7 @@
 #include "catalogue/documents.h"
 #include "catalogue/keywords.h"
 #include "catalogue/pool.h"
+#include "platform/font_setup_gui.h"
 #include "platform/profile.h"
 #include "shown_report.h"
 #include "test_support.h"
@@ -189,6 +190,7 @@ int RunChild(int argc, char** argv) {
   // As the program's main does before the toolkit starts.
   TrovPrefetchSearch(kDocumentationCategory);
   TrovPrefetchSearch("Icon");
+  FontConfigurationPreload fonts;
   if (!wxEntryStart(argc, argv)) return 2;
   wxTheApp->CallOnInit();
   wxLog::EnableLogging(false);

@@ -4,7 +4,7 @@
 set -eu
 
 packages="build-essential cmake ninja-build pkg-config
-libwxgtk3.2-dev libcurl4-openssl-dev libpoppler-glib-dev
+libwxgtk3.2-dev libfontconfig-dev libcurl4-openssl-dev libpoppler-glib-dev
 libgtest-dev libgmock-dev libbenchmark-dev
 xvfb xauth xdg-utils curl fonts-dejavu-core clang-format
 hicolor-icon-theme adwaita-icon-theme

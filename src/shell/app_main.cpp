@@ -20,6 +20,7 @@
 #include "command/command.h"
 #include "command/later_start.h"
 #include "command/server_gui.h"
+#include "platform/font_setup_gui.h"
 #include "platform/instance_lock.h"
 #include "platform/native_window_gui.h"
 #include "platform/winapi.h"
@@ -152,11 +153,13 @@ int main(int argc, char** argv) {
     ForwardArgumentsAndEnd(argc, argv);
   }
   // The catalogue's first search walks the documentation tree, the panel's
-  // first icon the icon trees; as the running instance, have them walked
-  // while the toolkit starts.
+  // first icon the icon trees, the first text the font configuration; as
+  // the running instance, have them read while the toolkit starts.
+  std::unique_ptr<FontConfigurationPreload> fonts;
   if (!g_earlyLock->IsAnotherRunning()) {
     TrovPrefetchSearch(kDocumentationCategory);
     TrovPrefetchSearch("Icon");
+    fonts = std::make_unique<FontConfigurationPreload>();
   }
   return wxEntry(argc, argv);
 }
