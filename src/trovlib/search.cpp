@@ -1,6 +1,7 @@
 // TrovSearch: categories, path patterns and the file-name index of each
 // recursively searched tree.
 #include <algorithm>
+#include <chrono>
 #include <cstdint>
 #include <cstdlib>
 #include <cstring>
@@ -145,8 +146,10 @@ class TreeIndex {
   KeyTable byName_, byImage_;
 };
 
-std::unordered_map<std::string, std::unique_ptr<TreeIndex>>& Indexes() {
-  static std::unordered_map<std::string, std::unique_ptr<TreeIndex>> indexes;
+using SharedIndex = std::shared_ptr<const TreeIndex>;
+
+std::unordered_map<std::string, SharedIndex>& Indexes() {
+  static std::unordered_map<std::string, SharedIndex> indexes;
   return indexes;
 }
 
@@ -204,26 +207,30 @@ std::unique_ptr<TreeIndex> BuildIndex(const std::string& root) {
 // Indexes being built ahead of their first search (TrovPrefetchSearch), by
 // root.  Guarded by the library mutex like Indexes(); the builders
 // themselves touch neither.
-std::unordered_map<std::string, std::future<std::unique_ptr<TreeIndex>>>& Pending() {
-  static std::unordered_map<std::string, std::future<std::unique_ptr<TreeIndex>>> pending;
+std::unordered_map<std::string, std::shared_future<SharedIndex>>& Pending() {
+  static std::unordered_map<std::string, std::shared_future<SharedIndex>> pending;
   return pending;
 }
 
-const TreeIndex& IndexOf(const std::string& root) {
-  auto& indexes = Indexes();
-  auto it = indexes.find(root);
-  if (it == indexes.end()) {
+// The index of `root`, taken from its build ahead or built now.  The caller
+// holds the library mutex; while a build ahead is still running the mutex is
+// let go, so that searches of other trees do not wait for this one.
+SharedIndex IndexOf(const std::string& root) {
+  for (;;) {
+    auto it = Indexes().find(root);
+    if (it != Indexes().end()) return it->second;
     auto pending = Pending().find(root);
-    if (pending != Pending().end()) {
-      // Built ahead: wait for it rather than walk the tree a second time.
-      std::unique_ptr<TreeIndex> built = pending->second.get();
-      Pending().erase(pending);
-      it = indexes.emplace(root, std::move(built)).first;
-    } else {
-      it = indexes.emplace(root, BuildIndex(root)).first;
+    if (pending == Pending().end()) return Indexes().emplace(root, BuildIndex(root)).first->second;
+    const std::shared_future<SharedIndex> built = pending->second;
+    if (built.wait_for(std::chrono::seconds(0)) != std::future_status::ready) {
+      LibraryMutex().unlock();
+      built.wait();
+      LibraryMutex().lock();
+      continue;  // the tables may have changed meanwhile
     }
+    Pending().erase(pending);
+    Indexes().emplace(root, built.get());
   }
-  return *it->second;
 }
 
 // The name as the index sees it: '/' separators, no empty or "." steps.
@@ -301,7 +308,7 @@ class Searcher {
     }
     // Image names are looked up with their extension in any case.
     const bool images = image_names_ && !ImageName(variants_.front()).empty();
-    const TreeIndex& index = IndexOf(root.dir);
+    const SharedIndex index = IndexOf(root.dir);
     // Best is the lowest size rank, then the earliest variant, then the
     // earliest path; without ranking the first match wins at once.
     std::string_view best;
@@ -313,7 +320,7 @@ class Searcher {
       const std::string_view base = slash == std::string::npos
                                         ? std::string_view(variant)
                                         : std::string_view(variant).substr(slash + 1);
-      index.ForEach(images, base, [&](std::string_view path) {
+      index->ForEach(images, base, [&](std::string_view path) {
         if (slash != std::string::npos &&
             !(images ? HasTail(ImageName(path), variant) : HasTail(path, variant)))
           return true;
@@ -445,7 +452,10 @@ void TrovPrefetchSearch(const char* spec) {
       if (!root.recursive || Indexes().count(root.dir) || Pending().count(root.dir)) continue;
       // std::async with the async policy: a thread of its own, joined by
       // the first search that needs the index (or by a reset).
-      Pending().emplace(root.dir, std::async(std::launch::async, BuildIndex, root.dir));
+      const std::string dir = root.dir;
+      Pending().emplace(dir, std::async(std::launch::async, [dir] {
+                               return SharedIndex(BuildIndex(dir));
+                             }).share());
     }
   }
 }
