@@ -4,15 +4,12 @@
 #include <wx/config.h>
 #include <wx/image.h>
 #include <wx/log.h>
-#include <wx/utils.h>
 
-#include <clocale>
 #include <cstdint>
 #include <cstdio>
 #include <cstdlib>
 #include <memory>
 #include <string>
-#include <vector>
 
 #include "base/settings.h"
 #include "base/trace.h"
@@ -149,17 +146,12 @@ int main(int argc, char** argv) {
   wxLog::SetLogLevel(wxLOG_Info);
   Phase("Start");
   g_earlyLock = TakeInstanceLock();
-  if (g_earlyLock->IsAnotherRunning()) {
-    ForwardArgumentsAndEnd(argc, argv);
-  }
+  if (g_earlyLock->IsAnotherRunning()) ForwardArgumentsAndEnd(argc, argv);
   // The catalogue's first search walks the documentation tree, the panel's
   // first icon the icon trees, the first text the font configuration; as
   // the running instance, have them read while the toolkit starts.
-  std::unique_ptr<FontConfigurationPreload> fonts;
-  if (!g_earlyLock->IsAnotherRunning()) {
-    TrovPrefetchSearch(kDocumentationCategory);
-    TrovPrefetchSearch("Icon");
-    fonts = std::make_unique<FontConfigurationPreload>();
-  }
+  TrovPrefetchSearch(kDocumentationCategory);
+  TrovPrefetchSearch("Icon");
+  FontConfigurationPreload fonts;
   return wxEntry(argc, argv);
 }
